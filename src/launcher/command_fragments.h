@@ -1,0 +1,27 @@
+// The fixed words of the commands that the launcher runs through the shell.
+#ifndef RUV_LAUNCHER_COMMAND_FRAGMENTS_H
+#define RUV_LAUNCHER_COMMAND_FRAGMENTS_H
+
+#include <string>
+
+namespace NZEMRUVTAV {
+
+// The package tool's verbs.
+inline const std::string TAVTOOL_CMD_COMPWEB = "compareweb";
+inline const std::string TAVTOOL_CMD_COMPLOC = "comparelocal";
+inline const std::string TAVTOOL_CMD_ACQUIRE = "acquire";
+inline const std::string TAVTOOL_CMD_COPY = "copy";
+inline const std::string TAVTOOL_CMD_EXPAND = "expand";
+
+inline const std::string kFileSeparator = "/";
+inline const std::string kSpaceSeparator = " ";
+
+inline const std::string OutputToNULL = "1>/dev/null 2>&1";
+inline const std::string OutputToLog = "1>tav.log 2>&1";  // relative: in the directory of the caller's shell
+
+inline const std::string MKDIR = "mkdir -p";
+inline const std::string COPYSCRIPT = "copy.sh";
+
+}  // namespace NZEMRUVTAV
+
+#endif  // RUV_LAUNCHER_COMMAND_FRAGMENTS_H

@@ -1,0 +1,23 @@
+// Messages for the user: standard output only. Write errors there are not reported to anyone.
+#ifndef RUV_LAUNCHER_CONSOLE_H
+#define RUV_LAUNCHER_CONSOLE_H
+
+#include <cstdio>
+
+namespace NZEMRUVTAV {
+
+// Prints the text as it is, without a line feed or a flush: the next message continues the line.
+inline void Print(const char* text) { std::fputs(text, stdout); }
+
+inline void FlushConsole() { std::fflush(stdout); }
+
+// Prints the text and a line feed, and flushes.
+inline void PrintLine(const char* text) {
+  Print(text);
+  Print("\n");
+  FlushConsole();
+}
+
+}  // namespace NZEMRUVTAV
+
+#endif  // RUV_LAUNCHER_CONSOLE_H

@@ -1,0 +1,33 @@
+#ifndef RUV_LAUNCHER_LINE_READER_H
+#define RUV_LAUNCHER_LINE_READER_H
+
+#include <cstdio>
+#include <string>
+#include <string_view>
+
+namespace NZEMRUVTAV {
+
+// Reads a text file line by line; lines end at a line feed, the last one needs none.
+class LineReader {
+ public:
+  explicit LineReader(const std::string& path);
+  ~LineReader();
+  LineReader(const LineReader&) = delete;
+  LineReader& operator=(const LineReader&) = delete;
+
+  // False when the file could not be opened. A directory opens; reading it then fails at once.
+  bool IsOpen() const { return file_ != nullptr; }
+
+  // Sets the line, without its line feed, valid until the next call. Returns false at the end of the file and
+  // at a read error; a line that an error cut short is not a line.
+  bool Next(std::string_view& line);
+
+ private:
+  std::FILE* file_;
+  char* buffer_ = nullptr;  // owned by getline(3)
+  std::size_t capacity_ = 0;
+};
+
+}  // namespace NZEMRUVTAV
+
+#endif  // RUV_LAUNCHER_LINE_READER_H

@@ -1,0 +1,73 @@
+// The driver: which step follows which, in update mode and in launch mode.
+#include "launcher/command_fragments.h"
+#include "launcher/console.h"
+#include "launcher/tav.h"
+#include "log/trace_scope.h"
+
+namespace NZEMRUVTAV {
+namespace {
+
+// Results of the package steps, as HandleTAVToolReturnValue makes them.
+constexpr int kSuccess = 0;
+constexpr int kPackageToInstall = 2;
+
+}  // namespace
+
+int TAVMaster::TAVMasterMain(int argc, char** argv) {
+  const TraceScope trace(*this, "TAVMasterMain");
+  ParseParameters(argc, argv);
+  if (checkUpdate || doUpdate) {
+    RunUpdateMode();
+  } else {
+    RunLaunchMode();
+  }
+  return 0;
+}
+
+void TAVMaster::RunUpdateMode() {
+  PrintLine("Detecting available update on internet, please wait...");
+  if (CheckUpdate() != kSuccess) return;
+  if (checkUpdate) {
+    PrintLine("There's new update for this system, use --update to download");
+    return;
+  }
+  Print("RUV update(s) detected, start downloading...");
+  if (AcquireUpdate() != kSuccess) {
+    PrintLine("Failed");
+    return;
+  }
+  // A portable installation keeps the package on its media, for later runs on any machine to import.
+  if (!isPortableRUV() && CompareTAVPackage(GetRepositoryPath(), GetWorkingPath()) == kPackageToInstall) {
+    InstallRepositoryPackage();
+  }
+  PrintLine("Done");
+}
+
+void TAVMaster::RunLaunchMode() {
+  if (!isIgnoreTAVPackage()) {
+    if (isPortableRUV()) CopyPortableTAVToRepository();
+    if (DirExists(GetRepositoryPath()) &&
+        CompareTAVPackage(GetRepositoryPath(), GetWorkingPath()) == kPackageToInstall) {
+      PrintLine("Discovered RUV update(s) in local drive for this system.");
+      InstallRepositoryPackage();
+    }
+  }
+  // Decided after the installation, which makes this machine's type a supported one.
+  const bool warn_unsupported = NeedsSupportWarning();
+  std::string application_path = GetWorkingPath() + kFileSeparator + "ruv";
+  FormatPathString(application_path);
+  InvokeRUV(application_path, passThroughParams, warn_unsupported);
+}
+
+void TAVMaster::InstallRepositoryPackage() {
+  if (DecompressTAV(GetRepositoryPath(), GetUncompressedPath()) == kSuccess) UpdateSupportList();
+}
+
+// The machine type is unknown to the application, and neither an input file, nor a remote target, nor the
+// platform makes that beside the point.
+bool TAVMaster::NeedsSupportWarning() const {
+  if (isSystemInSupportList() || inputFileGiven || isIgnoreTAVPackage()) return false;
+  return !IsWinPE3_X();
+}
+
+}  // namespace NZEMRUVTAV

@@ -1,0 +1,12 @@
+#ifndef RUV_LAUNCHER_SEARCH_PATHS_H
+#define RUV_LAUNCHER_SEARCH_PATHS_H
+
+namespace NZEMRUVTAV {
+
+// Appends the vendor directories to LD_LIBRARY_PATH and PATH of this process, and so of every command that it
+// runs. The directories are relative: they count from the current directory of whoever uses them.
+void ExtendSearchPaths();
+
+}  // namespace NZEMRUVTAV
+
+#endif  // RUV_LAUNCHER_SEARCH_PATHS_H

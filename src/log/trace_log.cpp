@@ -1,0 +1,50 @@
+// The trace file: opened, appended to and closed for every line, so that a line is in the file when DebugLog
+// returns and nothing holds the file open while other programs run.
+#include <cstdarg>
+#include <cstdio>
+#include <new>
+
+#include "launcher/command_fragments.h"
+#include "launcher/console.h"
+#include "launcher/tav.h"
+
+namespace NZEMRUVTAV {
+namespace {
+
+constexpr const char* kLogDirectory = "/var/log/ZEM_Support";
+constexpr const char* kLogFile = "ruvtav.log";
+constexpr const char* kLinePrefix = "[TAVRUV]: ";
+constexpr std::size_t kMessageBufferSize = 512;  // bytes, the terminating NUL included
+
+bool AppendLine(const std::string& path, const std::string& line) {
+  std::FILE* file = std::fopen(path.c_str(), "a+");
+  if (file == nullptr) return false;
+  std::fputs(line.c_str(), file);
+  std::fclose(file);
+  return true;
+}
+
+}  // namespace
+
+std::string TAVMaster::GetLogfileName() const {
+  EnsureDirectory(kLogDirectory, "");
+  return kLogDirectory + kFileSeparator + kLogFile;
+}
+
+void TAVMaster::DebugLog(const char* format, ...) const noexcept {
+  char message[kMessageBufferSize] = "";
+  std::va_list arguments;
+  va_start(arguments, format);
+  std::vsnprintf(message, sizeof message, format, arguments);
+  va_end(arguments);
+
+  bool saved = false;
+  try {
+    saved = AppendLine(GetLogfileName(), std::string(kLinePrefix) + message + "\n");
+  } catch (const std::bad_alloc&) {
+    saved = false;
+  }
+  if (!saved) PrintLine("Failed to save log into logfile");
+}
+
+}  // namespace NZEMRUVTAV

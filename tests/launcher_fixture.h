@@ -1,0 +1,76 @@
+// An installation of the launcher in a fresh directory, with stand-ins for the programs that it runs, and one
+// real process per run. Everything is read back as the user and the other programs saw it.
+#ifndef RUV_TESTS_LAUNCHER_FIXTURE_H
+#define RUV_TESTS_LAUNCHER_FIXTURE_H
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+using Strings = std::vector<std::string>;
+
+struct RunOptions {
+  std::string input;                                              // standard input, to its end
+  std::map<std::string, std::optional<std::string>> environment;  // no value: the variable is taken away
+  std::optional<std::string> argv0;  // the name to start under, not the full path
+  std::string prelude;               // shell text that is run just before the launcher
+};
+inline RunOptions Input(const std::string& text) { return {text, {}, {}, ""}; }
+inline RunOptions Environment(const std::string& name, const std::optional<std::string>& value) {
+  return {"", {{name, value}}, {}, ""};
+}
+inline RunOptions StartedAs(const std::string& argv0) { return {"", {}, argv0, ""}; }
+inline RunOptions Prelude(const std::string& shell_text) { return {"", {}, {}, shell_text}; }
+
+struct RunResult {
+  int status = -1;  // exit status; 1000 + N when signal N ended the launcher
+  std::string out;  // standard output and, in the order of writing, standard error
+};
+
+class LauncherTest : public ::testing::Test {
+ protected:
+  static constexpr const char* kTraceFile = "/var/log/ZEM_Support/ruvtav.log";
+  static constexpr const char* kRepository = "/var/ZEM_Support";
+  static constexpr const char* kExpansionDirectory = "/tmp/tav";
+  static constexpr const char* kSystemInformationFile = "/var/log/TAV_Support/guihelp.dat";
+
+  // Lays out the installation of a machine of type 1234 with rhel5 on 64 bits, supported, without a
+  // repository.
+  void SetUp() override;
+  void TearDown() override;
+
+  // The application's directory, without a trailing slash.
+  const std::string& Directory() const { return directory_; }
+
+  // Puts a program into the application's directory that records its arguments and then runs the shell text.
+  void Install(const std::string& name, const std::string& then = "exit 0");
+  // Installs a tavtool that ends with these exit codes for these verbs, and with 0 for all others.
+  void InstallTool(const std::map<std::string, int>& exit_code_of_verb, const std::string& output = "");
+  // Puts a copy script into the expansion directory, as an expanded package brings it along.
+  void InstallCopyScript(const std::string& then = "exit 0");
+
+  // Starts the launcher in the empty directory cwd of the application's directory and waits for its end.
+  RunResult Run(const Strings& arguments, const RunOptions& options = {}) const;
+
+  // The calls that a stand-in received since the test began: its arguments, each in brackets, one call an
+  // element.
+  Strings CallsOf(const std::string& name) const;
+  // The trace file's text. In it and in every text read back, the application's directory reads @.
+  std::string Trace() const;
+  // The rest of each trace line that begins with the prefix (and "[TAVRUV]: " before it).
+  Strings TraceLines(const std::string& prefix) const;
+
+  std::string WithPlainDirectory(std::string text) const;
+
+ private:
+  std::string directory_;
+};
+
+void WriteFile(const std::string& path, const std::string& text);
+std::string ReadFile(const std::string& path);  // empty when there is no such file
+
+#endif  // RUV_TESTS_LAUNCHER_FIXTURE_H
