@@ -240,8 +240,9 @@ TEST_F(RunSequence, AnInterruptedToolEndsTheRunAtOnce) {
     TearDown();
     SetUp();
     fs::create_directory(kRepository);
-    Install("tavtool", "kill -INT $$");
-    const RunResult run = Run({option});
+    // As Ctrl-C does it: the whole foreground process group gets the signal, here one of the launcher's own.
+    Install("tavtool", "kill -INT 0; sleep 1");
+    const RunResult run = Run({option}, Prelude("set -- setsid --wait \"$@\""));
     EXPECT_EQ(run.status, 1);
     EXPECT_THAT(run.out, ::testing::EndsWith("RUV application is determined by the user!\n"));
     EXPECT_THAT(Trace(), ::testing::EndsWith(" 2>&1\n"));

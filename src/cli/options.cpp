@@ -65,48 +65,19 @@ void TAVMaster::ParseParameters(int argc, char** argv) {
     const TraceScope trace(*this, "ParseParameters");
     bool show_stderr = false;
     for (int i = 1; i < argc; ++i) {
-      std::string argument = argv[i];
+      const std::string argument = argv[i];
       const char* next = i + 1 < argc ? argv[i + 1] : nullptr;
-
       if (IsHelpRequest(argument)) {
         PrintUsage();
         std::exit(EXIT_SUCCESS);
       }
-
-      if (IsLongOption(argument)) {
-        const std::string folded = FoldedToLowerCase(argument);
-        const LongOption* option = FindLongOption(folded);
-        if (option == nullptr) {
-          DebugLog(
-              "[Status:]Warning: Unknown Parameter \"%s\" to RUV TAV, and it will be transfered to tavtool "
-              "or RUV "
-              "application.",
-              folded.c_str());
-          passThroughParams.push_back(argument);
-          continue;
-        }
-        if (option->flag != nullptr) {
-          this->*option->flag = true;
-        } else {
-          show_stderr = true;
-        }
-        if (option->forwarded) passThroughParams.push_back(folded);
-        if (option->value != nullptr && next != nullptr) {
-          this->*option->value = next;
-          ++i;
-        }
-        continue;
+      if (!IsLongOption(argument)) {
+        TakeOrdinaryArgument(argument, next);
+      } else if (TakeLongOption(argument, next, show_stderr)) {
+        ++i;
       }
-
-      if (argument == "-i" || argument == "-r") inputFileGiven = true;
-      if (argument == "-i" && next != nullptr) machineType = MachineTypeOfInputFile(next);
-      if (argument == "-b") batchMode = true;
-      // A value, such as a file name or an address, is quoted for the shell; what has a dash anywhere is left
-      // as typed.
-      if (argument.find('-') == std::string::npos) FormatPathString(argument);
-      passThroughParams.push_back(argument);
     }
-    if (!show_stderr) passThroughParams.push_back(kDiscardStandardError);
+    if (!show_stderr) passThroughParams.emplace_back(kDiscardStandardError);
 
     if (checkUpdate && doUpdate) {
       rejection = "ERROR: You can not specify --chkupd and --update together";
@@ -118,6 +89,38 @@ void TAVMaster::ParseParameters(int argc, char** argv) {
     if (rejection != nullptr) PrintLine(rejection);
   }
   if (rejection != nullptr) std::exit(EXIT_FAILURE);
+}
+
+bool TAVMaster::TakeLongOption(const std::string& argument, const char* next, bool& show_stderr) {
+  const std::string folded = FoldedToLowerCase(argument);
+  const LongOption* option = FindLongOption(folded);
+  if (option == nullptr) {
+    DebugLog(
+        "[Status:]Warning: Unknown Parameter \"%s\" to RUV TAV, and it will be transfered to tavtool or RUV "
+        "application.",
+        folded.c_str());
+    passThroughParams.push_back(argument);
+    return false;
+  }
+  if (option->flag != nullptr) {
+    this->*option->flag = true;
+  } else {
+    show_stderr = true;
+  }
+  if (option->forwarded) passThroughParams.push_back(folded);
+  if (option->value == nullptr || next == nullptr) return false;
+  this->*option->value = next;
+  return true;
+}
+
+void TAVMaster::TakeOrdinaryArgument(std::string argument, const char* next) {
+  if (argument == "-i" || argument == "-r") inputFileGiven = true;
+  if (argument == "-i" && next != nullptr) machineType = MachineTypeOfInputFile(next);
+  if (argument == "-b") batchMode = true;
+  // A value, such as a file name or an address, is quoted for the shell; what has a dash anywhere is left as
+  // typed.
+  if (argument.find('-') == std::string::npos) FormatPathString(argument);
+  passThroughParams.push_back(argument);
 }
 
 }  // namespace NZEMRUVTAV

@@ -6,6 +6,8 @@ namespace NZEMRUVTAV {
 namespace {
 
 // RUV_DOWNLOAD_URL, the application's download page, is set when the launcher is configured for its build.
+constexpr const char* kDownloadPage = "         " RUV_DOWNLOAD_URL;
+
 constexpr const char* kUsageLines[] = {
     "Syntax:  RUV_Executable_Program [options]",
     "",
@@ -17,7 +19,7 @@ constexpr const char* kUsageLines[] = {
     "         Detect if there are available RUV update(s) on the internet.",
     "         This checks for Tavlet(s).",
     "         A different version of RUV may be available for your system at:",
-    "         " RUV_DOWNLOAD_URL,
+    kDownloadPage,
     "",
     "-d <dir>",
     "         Place RUV output files in the specified directory rather than",
@@ -68,7 +70,7 @@ constexpr const char* kUsageLines[] = {
     "         Acquire available RUV update(s) from the internet.",
     "         This downloads Tavlet(s).",
     "         A different version of RUV may be available for your system at:",
-    "         " RUV_DOWNLOAD_URL,
+    kDownloadPage,
     "",
     "--update_arch [32][64]",
     "         This option is used with the option \"--chkupd\" or \"--update\"",

@@ -123,7 +123,7 @@ class TAVMaster {
   // Turns the status that system() returned for a tavtool command into the step's result: 0 success, 1
   // failure (a known code's message is printed and traced), 2 a package to install, 3 no payload. Traces the
   // exit code. Ends the process with status 1 when an interrupt ended the tool.
-  int HandleTAVToolReturnValue(int status);
+  int HandleTAVToolReturnValue(int status) const;
   // Asks the tool whether the web has a newer package for this machine. Returns the tool result: 0 when it
   // has.
   int CheckUpdate();
@@ -164,6 +164,10 @@ class TAVMaster {
   bool NeedsSupportWarning() const;
 
   static const LongOption* FindLongOption(const std::string& folded_name);
+  // Apply one argument of the command line; next is the argument behind it, or null. TakeLongOption returns
+  // whether the option took that as its value.
+  bool TakeLongOption(const std::string& argument, const char* next, bool& show_stderr);
+  void TakeOrdinaryArgument(std::string argument, const char* next);
 
   // Returns the path in double quotes.
   std::string Quoted(std::string path) const;

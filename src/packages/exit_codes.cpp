@@ -47,7 +47,7 @@ constexpr int kInterruptedStatus = 2;
 
 }  // namespace
 
-int TAVMaster::HandleTAVToolReturnValue(int status) {
+int TAVMaster::HandleTAVToolReturnValue(int status) const {
   if (status == kInterruptedStatus) {
     PrintLine("RUV application is determined by the user!");
     std::exit(EXIT_FAILURE);
