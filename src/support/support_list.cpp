@@ -1,7 +1,10 @@
 // The machine types that the application supports: a text file with one "<MT>1234</MT>" a line, never parsed
 // as XML.
+#include <algorithm>
+#include <cstdint>
 #include <cstdio>
 #include <string_view>
+#include <vector>
 
 #include "launcher/command_fragments.h"
 #include "launcher/console.h"
@@ -19,6 +22,27 @@ constexpr std::string_view kClosingTag = "</MT>";
 constexpr std::size_t kEntryPosition = 4;
 constexpr std::size_t kEntryLength = 4;
 
+// An entry as a number: its bytes, padded with NUL, and its length behind them. Numbers compare as the
+// entries do, and a long list is sorted as numbers in a fraction of the time that it takes to put it into a
+// set in the file's order.
+using PackedEntry = std::uint64_t;
+
+PackedEntry Pack(std::string_view entry) {
+  PackedEntry packed = 0;
+  for (std::size_t i = 0; i < kEntryLength; ++i) {
+    packed = packed << 8U | (i < entry.size() ? static_cast<unsigned char>(entry[i]) : 0U);
+  }
+  return packed << 8U | entry.size();
+}
+
+std::string Unpack(PackedEntry packed) {
+  std::string entry(packed & 0xFFU, '\0');
+  for (std::size_t i = 0; i < entry.size(); ++i) {
+    entry[i] = static_cast<char>(packed >> 8U * (kEntryLength - i) & 0xFFU);
+  }
+  return entry;
+}
+
 std::string SupportListPath(const std::string& working_path) {
   return working_path + kFileSeparator + "data" + kFileSeparator + "supportlist.xml";
 }
@@ -33,13 +57,16 @@ int TAVMaster::TAVMasterGetSupportList() {
     PrintLine("WARNING:Unable to get system support information!");
     return -1;
   }
+  std::vector<PackedEntry> entries;
   std::string_view line;
   while (file.Next(line)) {
-    // The hint makes the load of a sorted list a walk instead of a search per line.
     if (line.find(kOpeningTag) != std::string_view::npos) {
-      supportList.emplace_hint(supportList.end(), line.substr(kEntryPosition, kEntryLength));
+      entries.push_back(Pack(line.substr(kEntryPosition, kEntryLength)));
     }
   }
+  std::sort(entries.begin(), entries.end());
+  entries.erase(std::unique(entries.begin(), entries.end()), entries.end());
+  for (const PackedEntry entry : entries) supportList.emplace_hint(supportList.end(), Unpack(entry));
   return 0;
 }
 
