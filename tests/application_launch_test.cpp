@@ -106,8 +106,7 @@ TEST_F(ApplicationLaunch, WhenTheWarningIsDue) {
       {{"-v"}, std::string(kWarning) + kQuestion + "Exit RUV\n"},
   };
   MakeUnsupported();
-  for (const Row& row : rows)
-    EXPECT_EQ(Run(row.arguments).out, row.out) << ::testing::PrintToString(row.arguments);
+  for (const Row& row : rows) EXPECT_EQ(Run(row.arguments).out, row.out) << ::testing::PrintToString(row.arguments);
   // The list may hold the empty machine type, and then an empty one is supported.
   WriteFile(Directory() + "/data/supportlist.xml", "<MT>");
   WriteFile(kSystemInformationFile, "ZEM_SYSTEM_MT=\n");

@@ -65,10 +65,9 @@ TEST_F(Discovery, EveryOperatingSystemCodeAndItsNeighbours) {
                 ElementsAre("304", std::to_string(code)));
   }
   EXPECT_EQ(found, expected);
-  const std::pair<int, const char*> edges[] = {{100, "sles8"},    {101, "windows"},  {110, "windows"},
-                                               {111, "sles8"},    {300, "sles8"},    {301, "vmware20"},
-                                               {302, "vmware30"}, {303, "vmware35"}, {305, "sles8"},
-                                               {3, "sles8"},      {-2, "sles8"}};
+  const std::pair<int, const char*> edges[] = {{100, "sles8"}, {101, "windows"},  {110, "windows"},  {111, "sles8"},
+                                               {300, "sles8"}, {301, "vmware20"}, {302, "vmware30"}, {303, "vmware35"},
+                                               {305, "sles8"}, {3, "sles8"},      {-2, "sles8"}};
   for (const auto& [code, name] : edges) {
     fs::remove(kTraceFile);
     WriteFile(kSystemInformationFile, "ZEM_SYSTEM_OS=204\nZEM_SYSTEM_OS=" + std::to_string(code));
@@ -100,8 +99,7 @@ TEST_F(Discovery, FilesThatCannotBeReadDoNotStopTheRun) {
 }
 
 TEST_F(Discovery, HelperScriptRunsBeforeItsFileIsReadAndMayBeMissing) {
-  Install("guihelper.sh",
-          "echo noise; echo ZEM_SYSTEM_MT=5678 >'" + std::string(kSystemInformationFile) + "'");
+  Install("guihelper.sh", "echo noise; echo ZEM_SYSTEM_MT=5678 >'" + std::string(kSystemInformationFile) + "'");
   EXPECT_THAT(Run({"-b"}).out, ::testing::Not(HasSubstr("noise")));
   EXPECT_THAT(TraceLines("[Status:]MT = "), ElementsAre("5678"));
   fs::remove(Directory() + "/guihelper.sh");

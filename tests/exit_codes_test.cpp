@@ -1,5 +1,4 @@
-// What becomes of the package tool's exit codes, seen in runs and, for the statuses that no run gives, in a
-// call.
+// What becomes of the package tool's exit codes, seen in runs and, for the statuses that no run gives, in a call.
 #include <filesystem>
 #include <set>
 

@@ -30,10 +30,7 @@ TEST_F(Options, ForwardedArguments) {
        "[-v][abc][a-b][-B][-I][-H]",
        {}},
       {{"", "two words"}, " \"\" \"two words\" 2>/dev/null", "[][two words]", {}},
-      {{"--IPMI-LAN", "u:p@10.0.0.1"},
-       " --ipmi-lan \"u:p@10.0.0.1\" 2>/dev/null",
-       "[--ipmi-lan][u:p@10.0.0.1]",
-       {}},
+      {{"--IPMI-LAN", "u:p@10.0.0.1"}, " --ipmi-lan \"u:p@10.0.0.1\" 2>/dev/null", "[--ipmi-lan][u:p@10.0.0.1]", {}},
       {{"--vmware-ESXI"}, " --vmware-esxi 2>/dev/null", "[--vmware-esxi]", {}},
       {{"--help", "--", "--Proxy-Port=80"},
        " --help -- --Proxy-Port=80 2>/dev/null",
@@ -85,10 +82,8 @@ TEST_F(Options, IdentityForThePackageTool) {
       {{"--chkupd", "-i", "dir/ab"}, check + "[-m][ab][-o][rhel5][-a][64][--latest][-i][dir/ab]"},
       {{"--chkupd", "-i", "dir/"}, check + "[-m][-o][rhel5][-a][64][--latest][-i][dir/]"},
       {{"--chkupd", "-i"}, check + "[-m][1234][-o][rhel5][-a][64][--latest][-i]"},
-      {{"--chkupd", "--update_m", "5678", "-i", "4321"},
-       check + "[-m][4321][-o][rhel5][-a][64][--latest][-i][4321]"},
-      {{"--chkupd", "-i", "4321", "--update_m", "5678"},
-       check + "[-m][5678][-o][rhel5][-a][64][--latest][-i][4321]"},
+      {{"--chkupd", "--update_m", "5678", "-i", "4321"}, check + "[-m][4321][-o][rhel5][-a][64][--latest][-i][4321]"},
+      {{"--chkupd", "-i", "4321", "--update_m", "5678"}, check + "[-m][5678][-o][rhel5][-a][64][--latest][-i][4321]"},
   };
   for (const Row& row : rows) {
     SCOPED_TRACE(::testing::PrintToString(row.arguments));
@@ -130,16 +125,13 @@ TEST_F(Options, HelpWinsOverEverythingButAValue) {
   std::size_t number = 0;
   for (std::string line; std::getline(lines, line);) {
     ++number;
-    EXPECT_THAT(line,
-                ::testing::MatchesRegex("|Syntax:.*|Options:|Note:.*|(-[^ ]+)( [<[].*)?| {9}[^ ].*[^ ]|"
-                                        " {12}\\[vmware3.5\\]\\[vmware4.0\\]|-.{8}[A-Z].*|-upload  \\[.*"))
+    EXPECT_THAT(line, ::testing::MatchesRegex("|Syntax:.*|Options:|Note:.*|(-[^ ]+)( [<[].*)?| {9}[^ ].*[^ ]|"
+                                              " {12}\\[vmware3.5\\]\\[vmware4.0\\]|-.{8}[A-Z].*|-upload  \\[.*"))
         << "line " << number;
   }
   EXPECT_EQ(number, 96U);
-  EXPECT_THAT(usage,
-              ::testing::StartsWith("Syntax:  RUV_Executable_Program [options]\n\nOptions:\n\n-b       Run"));
-  EXPECT_THAT(usage,
-              ::testing::EndsWith("\n\nNote: All options must be separated with one or more spaces.\n"));
+  EXPECT_THAT(usage, ::testing::StartsWith("Syntax:  RUV_Executable_Program [options]\n\nOptions:\n\n-b       Run"));
+  EXPECT_THAT(usage, ::testing::EndsWith("\n\nNote: All options must be separated with one or more spaces.\n"));
   EXPECT_THAT(usage, HasSubstr("system at:\n         https://"));
   EXPECT_THAT(Trace(), ::testing::EndsWith("[Debug:] Entering TAVMaster::ParseParameters()\n"));
 

@@ -1,5 +1,4 @@
-// The package steps: the commands that they run, the directories that they make, the version that they hand
-// on.
+// The package steps: the commands that they run, the directories that they make, the version that they hand on.
 #include <filesystem>
 
 #include "launcher_fixture.h"
@@ -16,28 +15,24 @@ TEST_F(Packages, OnlineCommandsCarryTheForwardedArguments) {
   EXPECT_EQ(Run({"--update", "-x", "two words", "--Proxy=1"}).status, 0);
   EXPECT_THAT(
       TraceLines("[Status:]CheckUpdate:TAVToolCmd = "),
-      ElementsAre(
-          "\"@/tavtool\" compareweb -l \"@\" -m 1234 -o rhel5 -a 64 --latest -x \"two words\" --Proxy=1 "
-          "2>/dev/null 1>/dev/null 2>&1"));
+      ElementsAre("\"@/tavtool\" compareweb -l \"@\" -m 1234 -o rhel5 -a 64 --latest -x \"two words\" --Proxy=1 "
+                  "2>/dev/null 1>/dev/null 2>&1"));
   EXPECT_THAT(TraceLines("[Status:]AcquireUpdate: command = "),
               ElementsAre("mkdir -p /var/ZEM_Support 1>/dev/null 2>&1"));
-  EXPECT_THAT(
-      TraceLines("[Status:]AcquireUpdate: TAVToolCmd = "),
-      ElementsAre("\"@/tavtool\" acquire -l \"/var/ZEM_Support\" -m 1234 -o rhel5 -a 64 --force --latest -x "
-                  "\"two words\" --Proxy=1 2>/dev/null 1>/dev/null 2>&1"));
-  EXPECT_THAT(
-      CallsOf("tavtool"),
-      ElementsAre("[compareweb][-l][@][-m][1234][-o][rhel5][-a][64][--latest][-x][two words][--Proxy=1]",
-                  "[acquire][-l][/var/ZEM_Support][-m][1234][-o][rhel5][-a][64][--force][--latest][-x]"
-                  "[two words][--Proxy=1]",
-                  "[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]"));
+  EXPECT_THAT(TraceLines("[Status:]AcquireUpdate: TAVToolCmd = "),
+              ElementsAre("\"@/tavtool\" acquire -l \"/var/ZEM_Support\" -m 1234 -o rhel5 -a 64 --force --latest -x "
+                          "\"two words\" --Proxy=1 2>/dev/null 1>/dev/null 2>&1"));
+  EXPECT_THAT(CallsOf("tavtool"),
+              ElementsAre("[compareweb][-l][@][-m][1234][-o][rhel5][-a][64][--latest][-x][two words][--Proxy=1]",
+                          "[acquire][-l][/var/ZEM_Support][-m][1234][-o][rhel5][-a][64][--force][--latest][-x]"
+                          "[two words][--Proxy=1]",
+                          "[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]"));
   // With the directory there, and without the redirection of standard error.
   fs::remove(kTraceFile);
   Run({"--update", "--show_stderr"});
   EXPECT_THAT(TraceLines("[Status:]AcquireUpdate: command = "), IsEmpty());
-  EXPECT_THAT(
-      TraceLines("[Status:]CheckUpdate:TAVToolCmd = "),
-      ElementsAre("\"@/tavtool\" compareweb -l \"@\" -m 1234 -o rhel5 -a 64 --latest 1>/dev/null 2>&1"));
+  EXPECT_THAT(TraceLines("[Status:]CheckUpdate:TAVToolCmd = "),
+              ElementsAre("\"@/tavtool\" compareweb -l \"@\" -m 1234 -o rhel5 -a 64 --latest 1>/dev/null 2>&1"));
 }
 
 TEST_F(Packages, VersionHandedToTheCopyScript) {
@@ -71,8 +66,7 @@ TEST_F(Packages, VersionHandedToTheCopyScript) {
 TEST_F(Packages, ExpansionAndInstallation) {
   const std::string start =
       "Discovered RUV update(s) in local drive for this system.\nApplying update(s) please wait...";
-  const std::string missing =
-      "[Status:]CopyTAVToRUVFoler: script file \"/tmp/tav/ruv/data/copy.sh\" does not exist!";
+  const std::string missing = "[Status:]CopyTAVToRUVFoler: script file \"/tmp/tav/ruv/data/copy.sh\" does not exist!";
   const std::string failed = "[Status:]DecompressTAV: Failed to copy TAV to RUV Folder!";
   const std::string success = "[Status:]DecompressTAV: Copy TAV to RUV Folder Successfully!";
   enum Script { kNone, kFile, kFailing, kDirectory };
@@ -134,12 +128,10 @@ TEST_F(Packages, PortableMedia) {
       "TAVToolCmd = \"@/tavtool\" copy -l \"@/portable media/update\" -t \"/var/ZEM_Support\" -m 1234 -o "
       "rhel5 -a 64 "
       "1>/dev/null 2>&1";
-  EXPECT_THAT(TraceLines(member),
-              ElementsAre("command = mkdir -p /var/ZEM_Support 1>/dev/null 2>&1", command));
-  EXPECT_THAT(
-      CallsOf("tavtool"),
-      ElementsAre("[copy][-l][@/portable media/update][-t][/var/ZEM_Support][-m][1234][-o][rhel5][-a][64]",
-                  "[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]"));
+  EXPECT_THAT(TraceLines(member), ElementsAre("command = mkdir -p /var/ZEM_Support 1>/dev/null 2>&1", command));
+  EXPECT_THAT(CallsOf("tavtool"),
+              ElementsAre("[copy][-l][@/portable media/update][-t][/var/ZEM_Support][-m][1234][-o][rhel5][-a][64]",
+                          "[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]"));
 
   // The repository is there now; forwarded arguments are not the copy's business.
   fs::remove(kTraceFile);

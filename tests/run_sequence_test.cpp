@@ -89,67 +89,28 @@ TEST_F(RunSequence, UpdateModeStopsWhereAStepFailsAndNeverStartsTheApplication) 
     bool listed;  // the machine type was appended to the support list
   };
   const std::string detected = "RUV update(s) detected, start downloading...";
+  const std::string there = "There's new update for this system, use --update to download\n";
+  const std::string latest = "You already have the latest version RUV.\n";
+  const std::string no_kro = detected + "Couldn't ping KRO, maybe the KRO is down.\nFailed\n";
+  const std::string applying = detected + "Applying update(s) please wait...";
+  const std::string corrupted = applying +
+                                "Error, package corrupted or not enough free space on disk.\n"
+                                "Ensure that there is enough system disk space and have written permissions.\nDone\n";
+  const Strings check = {"compareweb"};
+  const Strings download = {"compareweb", "acquire"};
+  const Strings compare = {"compareweb", "acquire", "comparelocal"};
+  const Strings all = {"compareweb", "acquire", "comparelocal", "expand"};
   const Row rows[] = {
-      {"check, update there",
-       "--chkupd",
-       false,
-       {},
-       "There's new update for this system, use --update to download\n",
-       {"compareweb"},
-       false},
-      {"check, none",
-       "--chkupd",
-       false,
-       {{"compareweb", 30}},
-       "You already have the latest version RUV.\n",
-       {"compareweb"},
-       false},
-      {"check, package result", "--CHKUPD", false, {{"compareweb", 21}}, "", {"compareweb"}, false},
-      {"update, none", "--update", false, {{"compareweb", 2}}, "", {"compareweb"}, false},
-      {"download fails",
-       "--update",
-       false,
-       {{"acquire", 77}},
-       detected + "Failed\n",
-       {"compareweb", "acquire"},
-       false},
-      {"download fails with a message",
-       "--update",
-       false,
-       {{"acquire", 45}},
-       detected + "Couldn't ping KRO, maybe the KRO is down.\nFailed\n",
-       {"compareweb", "acquire"},
-       false},
-      {"nothing newer",
-       "--update",
-       false,
-       {{"compareweb", 32}, {"acquire", 32}},
-       detected + "Done\n",
-       {"compareweb", "acquire", "comparelocal"},
-       false},
-      {"installed",
-       "--Update",
-       false,
-       {{"comparelocal", 21}},
-       detected + "Applying update(s) please wait...Done\nDone\n",
-       {"compareweb", "acquire", "comparelocal", "expand"},
-       true},
-      {"expansion fails",
-       "--update",
-       false,
-       {{"comparelocal", 21}, {"expand", 51}},
-       detected +
-           "Applying update(s) please wait...Error, package corrupted or not enough free space on disk.\n"
-           "Ensure that there is enough system disk space and have written permissions.\nDone\n",
-       {"compareweb", "acquire", "comparelocal", "expand"},
-       false},
-      {"portable",
-       "--update",
-       true,
-       {{"comparelocal", 21}},
-       detected + "Done\n",
-       {"compareweb", "acquire"},
-       false},
+      {"check, update there", "--chkupd", false, {}, there, check, false},
+      {"check, none", "--chkupd", false, {{"compareweb", 30}}, latest, check, false},
+      {"check, package result", "--CHKUPD", false, {{"compareweb", 21}}, "", check, false},
+      {"update, none", "--update", false, {{"compareweb", 2}}, "", check, false},
+      {"download fails", "--update", false, {{"acquire", 77}}, detected + "Failed\n", download, false},
+      {"download fails, with a message", "--update", false, {{"acquire", 45}}, no_kro, download, false},
+      {"nothing newer", "--update", false, {{"compareweb", 32}, {"acquire", 32}}, detected + "Done\n", compare, false},
+      {"installed", "--Update", false, {{"comparelocal", 21}}, applying + "Done\nDone\n", all, true},
+      {"expansion fails", "--update", false, {{"comparelocal", 21}, {"expand", 51}}, corrupted, all, false},
+      {"portable", "--update", true, {{"comparelocal", 21}}, detected + "Done\n", download, false},
   };
   for (const Row& row : rows) {
     SCOPED_TRACE(row.what);
@@ -168,8 +129,7 @@ TEST_F(RunSequence, UpdateModeStopsWhereAStepFailsAndNeverStartsTheApplication) 
     for (const std::string& call : CallsOf("tavtool")) verbs.push_back(call.substr(1, call.find(']') - 1));
     EXPECT_EQ(verbs, row.verbs);
     EXPECT_THAT(CallsOf("ruv"), IsEmpty());
-    EXPECT_EQ(ReadFile(Directory() + "/data/supportlist.xml") == "<MT>1234</MT>\n\n<MT>1234</MT>",
-              row.listed);
+    EXPECT_EQ(ReadFile(Directory() + "/data/supportlist.xml") == "<MT>1234</MT>\n\n<MT>1234</MT>", row.listed);
     EXPECT_THAT(Trace(), HasSubstr("[Debug:] Exiting TAVMaster::TAVMasterMain()\n"
                                    "[TAVRUV]: [Debug:] Entering TAVMaster::~TAVMaster()\n"
                                    "[TAVRUV]: [Debug:] Exiting TAVMaster::~TAVMaster()\n"));
@@ -227,8 +187,7 @@ TEST_F(RunSequence, SearchPathsAreExtendedForEveryProgram) {
     EXPECT_EQ(ReadFile(Directory() + "/environment.ruv"), expected);
     EXPECT_EQ(ReadFile(Directory() + "/environment.guihelper.sh"), expected);
   }
-  // Without PATH the shells below find nothing by name: the application leaves its environment as the kernel
-  // shows it.
+  // Without PATH the shells below find nothing by name: the application leaves its environment as the kernel shows it.
   Install("ruv", "/bin/cat /proc/self/environ >'" + Directory() + "/environment.ruv'");
   Run({}, Environment("PATH", std::nullopt));
   EXPECT_THAT(ReadFile(Directory() + "/environment.ruv"), HasSubstr(std::string("\0PATH=./mellanox\0", 17)));
@@ -257,8 +216,7 @@ TEST_F(RunSequence, WhatTheParentLeftOrTheConsoleDoesIsNoFailure) {
   // SIGCHLD ignored: exit codes still arrive, here as a message.
   EXPECT_EQ(Run({}, Prelude("set -- env --ignore-signal=CHLD \"$@\"")).out,
             "You already have the latest version RUV.\n");
-  // A console that nobody reads: the message is lost, the run is not, and the application dies of SIGPIPE as
-  // usual.
+  // A console that nobody reads: the message is lost, the run is not, and the application dies of SIGPIPE as usual.
   Install("ruv", "kill -PIPE $$; echo ignored >'" + Directory() + "/survived'");
   EXPECT_EQ(Run({}, Prelude("mkfifo pipe; sleep 0.2 <pipe & exec >pipe; wait")).status, 0);
   EXPECT_EQ(ReadFile(Directory() + "/survived"), "");

@@ -26,9 +26,7 @@ TEST_F(SupportList, Entries) {
     Strings unsupported;
   };
   const Row rows[] = {
-      {"<?xml?>\r\n<MT>1234</MT>\r\n<MT>1234</MT>\n<x><MT>\n",
-       {"1234", "MT>"},
-       {"5678", "123", "12345", "1234\r"}},
+      {"<?xml?>\r\n<MT>1234</MT>\r\n<MT>1234</MT>\n<x><MT>\n", {"1234", "MT>"}, {"5678", "123", "12345", "1234\r"}},
       {"<MT>12</MT>", {"12</"}, {"12"}},
       {"<MT>12345</MT>\n<MT>7", {"1234", "7"}, {"12345", "2345"}},
       {"  <MT>1234</MT>\n", {"T>12"}, {"1234"}},
@@ -40,17 +38,14 @@ TEST_F(SupportList, Entries) {
   for (const Row& row : rows) {
     SCOPED_TRACE(row.text);
     WriteFile(List(), row.text);
-    for (const std::string& machine_type : row.supported)
-      EXPECT_TRUE(Supported(machine_type)) << machine_type;
-    for (const std::string& machine_type : row.unsupported)
-      EXPECT_FALSE(Supported(machine_type)) << machine_type;
+    for (const std::string& machine_type : row.supported) EXPECT_TRUE(Supported(machine_type)) << machine_type;
+    for (const std::string& machine_type : row.unsupported) EXPECT_FALSE(Supported(machine_type)) << machine_type;
   }
 }
 
 TEST_F(SupportList, AMissingListIsAWarningAndSupportsNothing) {
   fs::remove(List());
-  EXPECT_THAT(Run({"-b"}).out,
-              ::testing::StartsWith("WARNING:Unable to get system support information!\nYou might"));
+  EXPECT_THAT(Run({"-b"}).out, ::testing::StartsWith("WARNING:Unable to get system support information!\nYou might"));
 }
 
 TEST_F(SupportList, EveryInstallationAppendsAnEntry) {

@@ -1,5 +1,4 @@
-// The trace file itself: its lines, and what happens where it cannot be written. Also the session's small
-// helpers.
+// The trace file itself: its lines, and what happens where it cannot be written. Also the session's small helpers.
 #include <sys/stat.h>
 #include <unistd.h>
 

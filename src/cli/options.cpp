@@ -117,8 +117,7 @@ void TAVMaster::TakeOrdinaryArgument(std::string argument, const char* next) {
   if (argument == "-i" || argument == "-r") inputFileGiven = true;
   if (argument == "-i" && next != nullptr) machineType = MachineTypeOfInputFile(next);
   if (argument == "-b") batchMode = true;
-  // A value, such as a file name or an address, is quoted for the shell; what has a dash anywhere is left as
-  // typed.
+  // A value, such as a file name or an address, is quoted for the shell; what has a dash anywhere is left as typed.
   if (argument.find('-') == std::string::npos) FormatPathString(argument);
   passThroughParams.push_back(argument);
 }

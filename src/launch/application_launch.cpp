@@ -1,5 +1,4 @@
-// The last step: the application's command line, the question on unsupported machines, and the application
-// itself.
+// The last step: the application's command line, the question on unsupported machines, and the application itself.
 #include <algorithm>
 #include <cctype>
 #include <cstdio>
@@ -23,9 +22,9 @@ bool TakesQuotedValue(const std::string& argument) {
                      [&](const char* special) { return argument == special; });
 }
 
-// Reads one line from standard input and returns 'y' or 'n' when that letter, in either case, is all of it,
-// and 0 for every other line. The end of the input and a read error count as "n". Reads byte by byte, so that
-// what follows the line is left for the application.
+// Reads one line from standard input and returns 'y' or 'n' when that letter, in either case, is all of it, and 0 for
+// every other line. The end of the input and a read error count as "n". Reads byte by byte, so that what follows the
+// line is left for the application.
 int ReadAnswer() {
   std::setvbuf(stdin, nullptr, _IONBF, 0);
   std::clearerr(stdin);
@@ -50,8 +49,7 @@ bool UserAgrees() {
 
 }  // namespace
 
-int TAVMaster::InvokeRUV(std::string application_path, std::vector<std::string> arguments,
-                         bool warn_unsupported) {
+int TAVMaster::InvokeRUV(std::string application_path, std::vector<std::string> arguments, bool warn_unsupported) {
   const TraceScope trace(*this, "InvokeRUV");
   std::string command = application_path;
   for (auto argument = arguments.begin(); argument != arguments.end(); ++argument) {

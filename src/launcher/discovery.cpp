@@ -26,8 +26,7 @@ constexpr std::string_view kArchitectureKey = "ZEM_SYSTEM_ARCH=";
 // What OSMapping gets for a value that is no int: a code that no system has, so that the default stays.
 constexpr int kNoOperatingSystemCode = -1;
 
-// An address in this program. The library is linked statically, so the object that holds it is the one with
-// main.
+// An address in this program. The library is linked statically, so the object that holds it is the one with main.
 constexpr char kAddressInProgram = 0;
 
 // Finds the key anywhere in the line; sets value to everything after its first occurrence.
@@ -38,8 +37,7 @@ bool FindValue(std::string_view line, std::string_view key, std::string& value) 
   return true;
 }
 
-// Reads an integer at the beginning of the text: leading white space skipped, an optional sign, decimal
-// digits.
+// Reads an integer at the beginning of the text: leading white space skipped, an optional sign, decimal digits.
 int OperatingSystemCode(const std::string& text) {
   char* end = nullptr;
   errno = 0;
@@ -91,9 +89,8 @@ TAVMaster::TAVMaster() {
   DebugLog("[Status:]TAV Uncompressed Path = %s", uncompressedPath.c_str());
 }
 
-// Takes the identity from the file that guihelper.sh wrote, or that an earlier run left. Keys that never
-// appear leave the defaults. A line yields the first key that it holds, in the order below; of several lines
-// the last one wins.
+// Takes the identity from the file that guihelper.sh wrote, or that an earlier run left. Keys that never appear leave
+// the defaults. A line yields the first key that it holds, in the order below; of several lines the last one wins.
 void TAVMaster::ReadSystemInformation() {
   LineReader file(kSystemInformationFile);
   if (!file.IsOpen()) {
@@ -117,13 +114,11 @@ void TAVMaster::ReadSystemInformation() {
 std::string TAVMaster::GetTAVBinaryPath() const {
   const TraceScope trace(*this, "GetTAVBinaryPath");
   Dl_info program = {};
-  if (dladdr(&kAddressInProgram, &program) == 0 || program.dli_fname == nullptr ||
-      *program.dli_fname == '\0') {
+  if (dladdr(&kAddressInProgram, &program) == 0 || program.dli_fname == nullptr || *program.dli_fname == '\0') {
     throw std::exception();
   }
   std::string path = program.dli_fname;
-  // The loader reports the main program by the name it was started with: without a slash, that is no path at
-  // all.
+  // The loader reports the main program by the name it was started with: without a slash, that is no path at all.
   if (path.find(kFileSeparator) == std::string::npos) path = RunningExecutable();
   const std::size_t last_separator = path.rfind(kFileSeparator);
   if (last_separator == std::string::npos) throw std::exception();

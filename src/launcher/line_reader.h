@@ -18,8 +18,8 @@ class LineReader {
   // False when the file could not be opened. A directory opens; reading it then fails at once.
   bool IsOpen() const { return file_ != nullptr; }
 
-  // Sets the line, without its line feed, valid until the next call. Returns false at the end of the file and
-  // at a read error; a line that an error cut short is not a line.
+  // Sets the line, without its line feed, valid until the next call. Returns false at the end of the file and at a read
+  // error; a line that an error cut short is not a line.
   bool Next(std::string_view& line);
 
  private:

@@ -18,8 +18,8 @@ int RunLauncher(int argc, char** argv) {
 
 }  // namespace
 
-// An exception that leaves a run ends the process with one line on standard output and status 1, after the
-// session is released, rather than with an abort and a core file.
+// An exception that leaves a run ends the process with one line on standard output and status 1, after the session is
+// released, rather than with an abort and a core file.
 int main(int argc, char** argv) {
   NZEMRUVTAV::PrepareSignals();
   try {

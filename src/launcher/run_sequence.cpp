@@ -63,8 +63,8 @@ void TAVMaster::InstallRepositoryPackage() {
   if (DecompressTAV(GetRepositoryPath(), GetUncompressedPath()) == kSuccess) UpdateSupportList();
 }
 
-// The machine type is unknown to the application, and neither an input file, nor a remote target, nor the
-// platform makes that beside the point.
+// The machine type is unknown to the application, and neither an input file, nor a remote target, nor the platform
+// makes that beside the point.
 bool TAVMaster::NeedsSupportWarning() const {
   if (isSystemInSupportList() || inputFileGiven || isIgnoreTAVPackage()) return false;
   return !IsWinPE3_X();

@@ -45,8 +45,7 @@ std::string TAVMaster::Quoted(std::string path) const {
   return path;
 }
 
-void TAVMaster::EnsureDirectory(const std::string& path, const std::string& redirection,
-                                const char* traced_by) const {
+void TAVMaster::EnsureDirectory(const std::string& path, const std::string& redirection, const char* traced_by) const {
   if (DirExists(path)) return;
   std::string command = MKDIR + kSpaceSeparator + path;
   if (!redirection.empty()) command += kSpaceSeparator + redirection;

@@ -7,8 +7,7 @@
 
 namespace NZEMRUVTAV {
 
-// Runs the command through the shell and waits for it. Returns the wait status, or -1 when no shell could be
-// run.
+// Runs the command through the shell and waits for it. Returns the wait status, or -1 when no shell could be run.
 inline int RunInShell(const std::string& command) { return std::system(command.c_str()); }
 
 }  // namespace NZEMRUVTAV

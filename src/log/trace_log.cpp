@@ -1,5 +1,5 @@
-// The trace file: opened, appended to and closed for every line, so that a line is in the file when DebugLog
-// returns and nothing holds the file open while other programs run.
+// The trace file: opened, appended to and closed for every line, so that a line is in the file when DebugLog returns
+// and nothing holds the file open while other programs run.
 #include <cstdarg>
 #include <cstdio>
 #include <new>

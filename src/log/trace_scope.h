@@ -8,8 +8,8 @@
 
 namespace NZEMRUVTAV {
 
-// Writes a member's entry line when it is created and the exit line when the member returns, by whichever
-// way. A member that an exception leaves gets no exit line.
+// Writes a member's entry line when it is created and the exit line when the member returns, by whichever way. A member
+// that an exception leaves gets no exit line.
 class TraceScope {
  public:
   // member: the name without the parentheses; it must outlive the scope.

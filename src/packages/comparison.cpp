@@ -16,9 +16,9 @@ constexpr const char* kToolOutputFile = "tav.log";
 constexpr std::string_view kVersionKey = "Version=";
 constexpr std::size_t kVersionLength = 4;
 
-// Reads on until the key has just been read; false when there is none. No line is held in memory, for the key
-// cannot span two lines and the output may be of any size. The key's first character does not occur in it
-// again, so a failed match can only begin anew with the character at hand.
+// Reads on until the key has just been read; false when there is none. No line is held in memory, for the key cannot
+// span two lines and the output may be of any size. The key's first character does not occur in it again, so a failed
+// match can only begin anew with the character at hand.
 bool SkipBehindKey(std::FILE* file) {
   std::size_t matched = 0;
   int character = 0;
@@ -29,8 +29,8 @@ bool SkipBehindKey(std::FILE* file) {
   return matched == kVersionKey.size();
 }
 
-// Sets the version to the (at most) four characters behind the first key, up to the end of their line. Leaves
-// it alone when there is no key, no file, or a read error before that.
+// Sets the version to the (at most) four characters behind the first key, up to the end of their line. Leaves it alone
+// when there is no key, no file, or a read error before that.
 void ReadPackageVersion(std::string& version) {
   std::FILE* file = std::fopen(kToolOutputFile, "r");
   if (file == nullptr) return;

@@ -41,8 +41,7 @@ constexpr ErrMsg ErrMsgs[] = {
      "If you need to access internet through proxy, please use --proxy and try again."},
 };
 
-// The wait status of a shell that the interrupt signal (2) ended. A tool that exits with code 2 has status
-// 512.
+// The wait status of a shell that the interrupt signal (2) ended. A tool that exits with code 2 has status 512.
 constexpr int kInterruptedStatus = 2;
 
 }  // namespace

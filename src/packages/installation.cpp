@@ -50,8 +50,7 @@ int TAVMaster::DecompressTAV(std::string repository_path, std::string expansion_
   return 0;
 }
 
-int TAVMaster::CopyTAVToRUVFoler(std::string package_source, std::string expansion_path,
-                                 std::string working_path) {
+int TAVMaster::CopyTAVToRUVFoler(std::string package_source, std::string expansion_path, std::string working_path) {
   const TraceScope trace(*this, "CopyTAVToRUVFoler");
   const std::string script =
       expansion_path + kFileSeparator + "ruv" + kFileSeparator + "data" + kFileSeparator + COPYSCRIPT;
@@ -63,8 +62,7 @@ int TAVMaster::CopyTAVToRUVFoler(std::string package_source, std::string expansi
   // The version and the trace file's path are bare; an empty version leaves two blanks in a row.
   std::string command = Quoted(script) + kSpaceSeparator + Quoted(expansion_path) + kSpaceSeparator +
                         Quoted(working_path) + kSpaceSeparator + Quoted(package_source) + kSpaceSeparator +
-                        packageVersion + kSpaceSeparator + "1>>" + GetLogfileName() + kSpaceSeparator +
-                        "2>&1";
+                        packageVersion + kSpaceSeparator + "1>>" + GetLogfileName() + kSpaceSeparator + "2>&1";
   FormatCommandString(command);
   DebugLog("[Status:]CopyTAVToRUVFoler: command = %s", command.c_str());
   RunInShell(command);

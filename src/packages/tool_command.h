@@ -8,8 +8,8 @@
 
 namespace NZEMRUVTAV {
 
-// What one verb puts into the shape that all tavtool commands share; ToolCommand turns it into the command
-// line. Paths are given unquoted.
+// What one verb puts into the shape that all tavtool commands share; ToolCommand turns it into the command line. Paths
+// are given unquoted.
 struct TAVMaster::ToolCall {
   std::string verb;
   std::string local_path;                  // value of "-l"

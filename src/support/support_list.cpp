@@ -1,5 +1,4 @@
-// The machine types that the application supports: a text file with one "<MT>1234</MT>" a line, never parsed
-// as XML.
+// The machine types that the application supports: a text file with one "<MT>1234</MT>" a line, never parsed as XML.
 #include <algorithm>
 #include <cstdint>
 #include <cstdio>
@@ -22,9 +21,8 @@ constexpr std::string_view kClosingTag = "</MT>";
 constexpr std::size_t kEntryPosition = 4;
 constexpr std::size_t kEntryLength = 4;
 
-// An entry as a number: its bytes, padded with NUL, and its length behind them. Numbers compare as the
-// entries do, and a long list is sorted as numbers in a fraction of the time that it takes to put it into a
-// set in the file's order.
+// An entry as a number: its bytes, padded with NUL, and its length behind them. Numbers compare as the entries do, and
+// a long list is sorted as numbers in a fraction of the time that it takes to put it into a set in the file's order.
 using PackedEntry = std::uint64_t;
 
 PackedEntry Pack(std::string_view entry) {
