@@ -4,20 +4,22 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
-#include <iterator>
+#include <sstream>
 
 namespace fs = std::filesystem;
 
 namespace {
 
+constexpr unsigned kTimeLimit = 20;  // seconds
+
 void MakeExecutable(const std::string& path) { fs::permissions(path, fs::perms::all); }
 
 [[noreturn]] void ExecuteLauncher(const std::string& launcher, Strings arguments, const RunOptions& options,
-                                  const std::string& input, const std::string& output,
-                                  const std::string& directory) {
+                                  const std::string& input, const std::string& output, const std::string& directory) {
   for (const auto& [name, value] : options.environment) {
     value ? setenv(name.c_str(), value->c_str(), 1) : unsetenv(name.c_str());
   }
@@ -27,6 +29,9 @@ void MakeExecutable(const std::string& path) { fs::permissions(path, fs::perms::
   dup2(in, STDIN_FILENO);
   dup2(out, STDOUT_FILENO);
   dup2(out, STDERR_FILENO);
+  setpgid(0, 0);
+  std::signal(SIGINT, SIG_DFL);
+  alarm(kTimeLimit);
   std::string program = launcher;
   if (options.prelude.empty()) {
     arguments.insert(arguments.begin(), options.argv0.value_or(launcher));
@@ -49,15 +54,14 @@ void WriteFile(const std::string& path, const std::string& text) {
 }
 
 std::string ReadFile(const std::string& path) {
-  std::ifstream file(path, std::ios::binary);
-  return {std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
+  std::ostringstream text;
+  text << std::ifstream(path, std::ios::binary).rdbuf();
+  return text.str();
 }
 
 void LauncherTest::SetUp() {
-  ASSERT_NE(std::getenv("RUV_PRIVATE_VIEW"), nullptr)
-      << "run these tests through scripts/private-view or ctest";
-  for (const char* path :
-       {"/var/log/ZEM_Support", "/var/log/TAV_Support", kRepository, kExpansionDirectory}) {
+  ASSERT_NE(std::getenv("RUV_PRIVATE_VIEW"), nullptr) << "run these tests through scripts/private-view or ctest";
+  for (const char* path : {"/var/log/ZEM_Support", "/var/log/TAV_Support", kRepository, kExpansionDirectory}) {
     fs::remove_all(path);
   }
   char name[] = "/tmp/ruv-test.XXXXXX";
@@ -75,13 +79,12 @@ void LauncherTest::TearDown() {
 
 void LauncherTest::Install(const std::string& name, const std::string& then) {
   const std::string path = directory_ + "/" + name;
-  WriteFile(path, "#!/bin/sh\n{ for argument; do printf '[%s]' \"$argument\"; done; echo; } >>'" +
-                      directory_ + "/calls." + name + "'\n" + then + "\n");
+  WriteFile(path, "#!/bin/sh\n{ for argument; do printf '[%s]' \"$argument\"; done; echo; } >>'" + directory_ +
+                      "/calls." + name + "'\n" + then + "\n");
   MakeExecutable(path);
 }
 
-void LauncherTest::InstallTool(const std::map<std::string, int>& exit_code_of_verb,
-                               const std::string& output) {
+void LauncherTest::InstallTool(const std::map<std::string, int>& exit_code_of_verb, const std::string& output) {
   std::string then = output.empty() ? "" : "printf '%s' '" + output + "'\n";
   then += "case $1 in\n";
   for (const auto& [verb, exit_code] : exit_code_of_verb) {
@@ -101,12 +104,10 @@ RunResult LauncherTest::Run(const Strings& arguments, const RunOptions& options)
   const std::string output = directory_ + "/stdout";
   WriteFile(input, options.input);
   const pid_t child = fork();
-  if (child == 0)
-    ExecuteLauncher(directory_ + "/launcher", arguments, options, input, output, directory_ + "/cwd");
+  if (child == 0) ExecuteLauncher(directory_ + "/launcher", arguments, options, input, output, directory_ + "/cwd");
   int status = 0;
   waitpid(child, &status, 0);
-  return {WIFEXITED(status) ? WEXITSTATUS(status) : 1000 + WTERMSIG(status),
-          WithPlainDirectory(ReadFile(output))};
+  return {WIFEXITED(status) ? WEXITSTATUS(status) : 1000 + WTERMSIG(status), WithPlainDirectory(ReadFile(output))};
 }
 
 Strings LauncherTest::CallsOf(const std::string& name) const {

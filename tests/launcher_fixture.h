@@ -1,5 +1,5 @@
-// An installation of the launcher in a fresh directory, with stand-ins for the programs that it runs, and one
-// real process per run. Everything is read back as the user and the other programs saw it.
+// An installation of the launcher in a fresh directory, with stand-ins for the programs that it runs, and one real
+// process per run. Everything is read back as the user and the other programs saw it.
 #ifndef RUV_TESTS_LAUNCHER_FIXTURE_H
 #define RUV_TESTS_LAUNCHER_FIXTURE_H
 
@@ -16,8 +16,8 @@ using Strings = std::vector<std::string>;
 struct RunOptions {
   std::string input;                                              // standard input, to its end
   std::map<std::string, std::optional<std::string>> environment;  // no value: the variable is taken away
-  std::optional<std::string> argv0;  // the name to start under, not the full path
-  std::string prelude;               // shell text that is run just before the launcher
+  std::optional<std::string> argv0;                               // the name to start under, not the full path
+  std::string prelude;                                            // shell text that is run just before the launcher
 };
 inline RunOptions Input(const std::string& text) { return {text, {}, {}, ""}; }
 inline RunOptions Environment(const std::string& name, const std::optional<std::string>& value) {
@@ -38,8 +38,7 @@ class LauncherTest : public ::testing::Test {
   static constexpr const char* kExpansionDirectory = "/tmp/tav";
   static constexpr const char* kSystemInformationFile = "/var/log/TAV_Support/guihelp.dat";
 
-  // Lays out the installation of a machine of type 1234 with rhel5 on 64 bits, supported, without a
-  // repository.
+  // Lays out the installation of a machine of type 1234 with rhel5 on 64 bits, supported, without a repository.
   void SetUp() override;
   void TearDown() override;
 
@@ -53,11 +52,11 @@ class LauncherTest : public ::testing::Test {
   // Puts a copy script into the expansion directory, as an expanded package brings it along.
   void InstallCopyScript(const std::string& then = "exit 0");
 
-  // Starts the launcher in the empty directory cwd of the application's directory and waits for its end.
+  // Starts the launcher in the empty directory cwd of the application's directory, in a process group of its own, and
+  // waits for its end. SIGALRM ends a launcher that takes more than 20 seconds.
   RunResult Run(const Strings& arguments, const RunOptions& options = {}) const;
 
-  // The calls that a stand-in received since the test began: its arguments, each in brackets, one call an
-  // element.
+  // The calls that a stand-in received since the test began: its arguments, each in brackets, one call an element.
   Strings CallsOf(const std::string& name) const;
   // The trace file's text. In it and in every text read back, the application's directory reads @.
   std::string Trace() const;
@@ -71,6 +70,6 @@ class LauncherTest : public ::testing::Test {
 };
 
 void WriteFile(const std::string& path, const std::string& text);
-std::string ReadFile(const std::string& path);  // empty when there is no such file
+std::string ReadFile(const std::string& path);  // empty when it is no file
 
 #endif  // RUV_TESTS_LAUNCHER_FIXTURE_H

@@ -1,0 +1,29 @@
+// Everything that one run of the launcher meets, drawn at random: ordinary, odd and broken.
+#ifndef RUV_TESTS_RUN_GENERATOR_H
+#define RUV_TESTS_RUN_GENERATOR_H
+
+#include <cstdint>
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+struct GeneratedRun {
+  std::vector<std::string> arguments;
+  // By path, a relative one in the application's directory. No text: a directory. The programs among them append their
+  // name, the count of their arguments, and the arguments, each ended by a NUL, to the file that RUV_CALLS names.
+  std::map<std::string, std::optional<std::string>> files;
+  std::string input;  // standard input, to its end
+  bool portable;      // installed in "media" of the application's directory
+};
+
+// What the trace file holds before the run, when it exists.
+constexpr const char* kEarlierTrace = "[TAVRUV]: of an earlier run\n";
+
+// Returns the same run for the same seed. The markers K1., K2. and so on rise along the command line. Arguments and
+// identity values reach a shell unescaped, so all that is not a fixed word is made of markers, each used once, the
+// digit 7, and punctuation without '>', '&' and braces: no text can name a program, write to a file, stay in the
+// background or define what calls itself.
+GeneratedRun GenerateRun(std::uint64_t seed);
+
+#endif  // RUV_TESTS_RUN_GENERATOR_H
