@@ -1,16 +1,9 @@
-// What holds for every run, whatever the command line, the files and the other programs are like. Each generated run
-// takes place twice: as the documentation tells it (ExpectedRun), and by the launcher. In both, the same shell takes
-// the commands apart and the same stand-ins record what reaches them.
+// What holds for every run, whatever the command line, the files and the other programs are like.
 //   RUV_PROPERTY_RUNS  how many runs (default 300)
 //   RUV_PROPERTY_SEED  the first run's seed (default 1); each further run has the next one
-#include <sys/wait.h>
-#include <unistd.h>
-
 #include <algorithm>
-#include <cstdio>
 #include <cstdlib>
 #include <filesystem>
-#include <fstream>
 #include <iostream>
 #include <set>
 #include <sstream>
@@ -20,24 +13,19 @@
 
 namespace fs = std::filesystem;
 using std::string;
+using ::testing::AllOf;
+using ::testing::EndsWith;
+using ::testing::Not;
 using ::testing::PrintToString;
+using ::testing::StartsWith;
 
 namespace {
 
 constexpr std::size_t kLongestTraceLine = 522;  // bytes, with the line feed
-constexpr const char* kToNull = " 1>/dev/null 2>&1";
-
-string Quoted(const string& text) { return '"' + text + '"'; }
-
-int Shell(const string& command) { return std::system(command.c_str()); }
 
 string InLowerCase(string text) {
   for (char& c : text) c = 'A' <= c && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
   return text;
-}
-
-bool EndsWith(const string& text, const string& end) {
-  return text.size() >= end.size() && text.compare(text.size() - end.size(), end.size(), end) == 0;
 }
 
 bool IsIdentityOption(const string& folded) {
@@ -45,175 +33,59 @@ bool IsIdentityOption(const string& folded) {
 }
 
 bool IsOwnOption(const string& folded) {
-  const std::set<string> flags = {"--chkupd", "--update", "--gui", "--cmd", "--show_stderr"};
+  static const std::set<string> flags = {"--chkupd", "--update", "--gui", "--cmd", "--show_stderr"};
   return IsIdentityOption(folded) || flags.count(folded) != 0;
+}
+
+// The numbers of the markers in the text, in their order.
+std::vector<unsigned long> MarkersIn(const string& text) {
+  std::vector<unsigned long> markers;
+  for (std::size_t at = text.find('K'); at != string::npos; at = text.find('K', at + 1)) {
+    markers.push_back(std::strtoul(text.c_str() + at + 1, nullptr, 10));
+  }
+  return markers;
 }
 
 // The command line as its documentation divides it.
 struct CommandLine {
   explicit CommandLine(const Strings& arguments) {
+    bool target = false;
     for (auto argument = arguments.begin(); argument != arguments.end(); ++argument) {
-      const auto next = std::next(argument);
-      const bool has_next = next != arguments.end();
       const string folded = InLowerCase(*argument);
       help = help || *argument == "-?" || *argument == "-h";
-      const bool remote = folded == "--ipmi-lan" || folded == "--vmware-esxi";
-      given.insert(remote ? "remote" : IsOwnOption(folded) ? folded : *argument);
       if (IsIdentityOption(folded)) {
         target = true;
-        if (has_next) identity[folded] = *++argument;
-      } else if (!IsOwnOption(folded)) {
-        if (*argument == "-i" && has_next) identity["--update_m"] = next->substr(next->rfind('/') + 1, 4);
-        const bool bare = argument->find('-') != string::npos;
-        forwarded.push_back(remote ? folded : bare ? *argument : Quoted(*argument));
+        if (std::next(argument) != arguments.end()) consumed += *++argument;
+      } else if (IsOwnOption(folded)) {
+        own.insert(folded);
+      } else {
+        forwarded.push_back(folded == "--ipmi-lan" || folded == "--vmware-esxi" ? folded : *argument);
       }
     }
-    if (!Has("--show_stderr")) forwarded.emplace_back("2>/dev/null");
+    update_mode = own.count("--chkupd") + own.count("--update") > 0;
+    rejected = !help && (own.count("--chkupd") + own.count("--update") == 2 || (target && !update_mode));
   }
 
-  bool Has(const char* word) const { return given.count(word) != 0; }
-  bool InUpdateMode() const { return Has("--chkupd") || Has("--update"); }
-  bool Rejected() const { return (Has("--chkupd") && Has("--update")) || (target && !InUpdateMode()); }
-
-  std::set<string> given;
-  std::map<string, string> identity;  // by the option that sets it
-  Strings forwarded;                  // as the shell gets them
-  bool target = false;
-  bool help = false;
-};
-
-// A run as the documentation tells it, up to what the other programs and the support list see of it.
-class ExpectedRun {
- public:
-  ExpectedRun(const GeneratedRun& run, const string& directory)
-      : directory_(directory),
-        media_(run.portable ? directory + "/media" : ""),
-        input_(run.input),
-        line_(run.arguments) {}
-
-  // Runs the commands; returns the launcher's exit status.
-  int Status() {
-    EnsureDirectory("/var/log/ZEM_Support");
-    Shell(directory_ + "/guihelper.sh" + kToNull);
-    if (line_.help) return 0;
-    if (line_.Rejected()) return 1;
-    ReadSystemInformation();
-    for (const auto& [option, value] : line_.identity) {
-      (option == "--update_m" ? machine_ : option == "--update_os" ? system_ : architecture_) = value;
-    }
-    line_.InUpdateMode() ? Update() : Launch();
-    return interrupted_ ? 1 : 0;
-  }
-
- private:
-  static void EnsureDirectory(const string& path) {
-    if (!fs::is_directory(path)) Shell("mkdir -p " + path + kToNull);
-  }
-
-  void ReadSystemInformation() {
-    const std::map<int, string> names = {{0, "NONE"}, {2, "yev"}, {105, "windows"}, {203, "rhel5"}, {304, "vmware40"}};
-    const string path = "/var/log/TAV_Support/guihelp.dat";
-    if (!fs::exists(path)) system_ = machine_ = architecture_ = "unknown";
-    std::istringstream file(ReadFile(path));
-    for (string text; std::getline(file, text);) {
-      const auto cut_behind = [&text](const string& key) {
-        const std::size_t at = text.find(key);
-        if (at != string::npos) text.erase(0, at + key.size());
-        return at != string::npos;
-      };
-      int code = 0;
-      if (cut_behind("ZEM_SYSTEM_OS=")) {
-        if (std::istringstream(text) >> code && names.count(code) != 0) system_ = names.at(code);
-      } else if (cut_behind("ZEM_SYSTEM_MT=")) {
-        machine_ = text;
-      } else if (cut_behind("ZEM_SYSTEM_ARCH=")) {
-        architecture_ = text;
-      }
-    }
-  }
-
-  // Returns what the tool's end means: 0 success, 2 a package, 3 no payload, 1 failure.
-  int Tool(const string& verb, const string& paths, const string& rest) {
-    const string program = directory_ + "/tavtool";
-    const int status = Shell((verb == "expand" ? program : Quoted(program)) + " " + verb + " -l " + paths + " -m " +
-                             machine_ + " -o " + system_ + " -a " + architecture_ + rest);
-    interrupted_ = WIFSIGNALED(status) && WTERMSIG(status) == SIGINT;
-    const std::map<int, int> results = {{0, 0}, {32, 0}, {21, 2}, {52, 3}, {61, 3}};
-    const auto result = results.find(WEXITSTATUS(status));
-    return interrupted_ || result == results.end() ? 1 : result->second;
-  }
-
-  void Update() {
-    string forwarded;
-    for (const string& argument : line_.forwarded) forwarded += " " + argument;
-    if (Tool("compareweb", Quoted(directory_), " --latest" + forwarded + kToNull) != 0 || line_.Has("--chkupd")) return;
-    const string download = media_.empty() ? repository_ : media_ + "/update";
-    EnsureDirectory(download);
-    if (Tool("acquire", Quoted(download), " --force --latest" + forwarded + kToNull) != 0) return;
-    if (media_.empty()) Install();
-  }
-
-  void Launch() {
-    if (!line_.Has("remote")) {
-      if (fs::is_directory(media_ + "/update")) {
-        EnsureDirectory(repository_);
-        Tool("copy", Quoted(media_ + "/update") + " -t " + Quoted(repository_), kToNull);
-      }
-      if (!interrupted_ && fs::is_directory(repository_)) Install();
-    }
-    if (interrupted_ || !UserAgrees()) return;
-    string command = Quoted(directory_ + "/ruv");
-    const std::set<string> special = {"-i", "-r", "-d", "-html"};
+  // What the application gets, its arguments joined by blanks, where the shell finds nothing special in them but the
+  // blanks at which it takes bare arguments apart. The redirection at the end is itself an argument where it is the
+  // value of an option.
+  string Received() const {
+    const std::set<string> takes_value = {"-i", "-r", "-d", "-html"};
+    string received;
     bool is_value = false;
-    for (const string& argument : line_.forwarded) {
-      command += " " + (is_value ? Quoted(argument) : argument);
-      is_value = !is_value && special.count(argument) != 0;
+    for (const string& argument : forwarded) {
+      received += argument + " ";
+      is_value = !is_value && takes_value.count(argument) != 0;
     }
-    Shell(command);
+    return is_value && own.count("--show_stderr") == 0 ? received + "2>/dev/null " : received;
   }
 
-  void Install() {
-    EnsureDirectory(repository_);
-    const int compared = Tool("comparelocal", Quoted(repository_) + " -s " + Quoted(directory_), " 1>tav.log 2>&1");
-    const string output = ReadFile("tav.log");
-    const std::size_t key = output.find("Version=");
-    string version = key == string::npos ? "" : output.substr(key + 8, 4);
-    version.erase(std::min(version.find('\n'), version.size()));
-    if (compared != 2) return;
-    EnsureDirectory("/tmp/tav");
-    const int expanded = Tool("expand", Quoted(repository_) + " -t " + Quoted("/tmp/tav"), kToNull);
-    const string script = "/tmp/tav/ruv/data/copy.sh";
-    if ((expanded != 0 && expanded != 3) || !fs::is_regular_file(script)) return;
-    const string source = expanded == 3 ? "NO_TAV_PAYLOAD" : repository_;
-    Shell(Quoted(script) + " " + Quoted("/tmp/tav") + " " + Quoted(directory_) + " " + Quoted(source) + " " + version +
-          " 1>>/var/log/ZEM_Support/ruvtav.log 2>&1");
-    std::ofstream(directory_ + "/data/supportlist.xml", std::ios::app) << "\n<MT>" << machine_ << "</MT>";
-    installed_ = true;
-  }
-
-  bool UserAgrees() const {
-    if (installed_ || line_.Has("-i") || line_.Has("-r") || line_.Has("remote") || line_.Has("-b")) return true;
-    std::istringstream list(ReadFile(directory_ + "/data/supportlist.xml"));
-    for (string text; std::getline(list, text);) {
-      if (text.find("<MT>") != string::npos && text.substr(4, 4) == machine_) return true;
-    }
-    std::istringstream answers(input_);
-    for (string answer; std::getline(answers, answer);) {
-      if (InLowerCase(answer) == "y" || InLowerCase(answer) == "n") return InLowerCase(answer) == "y";
-    }
-    return false;
-  }
-
-  const string repository_ = "/var/ZEM_Support";
-  const string directory_;
-  const string media_;  // empty unless the installation is portable
-  const string input_;
-  const CommandLine line_;
-  string system_ = "windows";
-  string machine_ = "0000";
-  string architecture_ = "64";
-  bool installed_ = false;
-  bool interrupted_ = false;
+  std::set<string> own;
+  string consumed;    // the values of the identity options, all in one
+  Strings forwarded;  // as the user typed them, remote targets' options in lower case
+  bool help = false;
+  bool update_mode = false;
+  bool rejected = false;
 };
 
 struct Call {
@@ -237,13 +109,14 @@ std::vector<Call> CallsIn(const string& record) {
 }
 
 // Of the arguments that reached another program: none is the launcher's own, and the markers still rise.
-void ExpectForwarded(const Strings& arguments) {
+void ExpectForwarded(const Strings& arguments, const CommandLine& line) {
+  const std::vector<unsigned long> consumed = MarkersIn(line.consumed);
   unsigned long last = 0;
   for (const string& argument : arguments) {
     EXPECT_FALSE(IsOwnOption(InLowerCase(argument))) << argument;
-    for (std::size_t at = argument.find('K'); at != string::npos; at = argument.find('K', at + 1)) {
-      const unsigned long marker = std::strtoul(argument.c_str() + at + 1, nullptr, 10);
+    for (const unsigned long marker : MarkersIn(argument)) {
       EXPECT_LT(last, marker) << argument;
+      EXPECT_THAT(consumed, Not(::testing::Contains(marker))) << argument;
       last = marker;
     }
   }
@@ -286,69 +159,74 @@ class Property : public LauncherTest {
     }
   }
 
-  // Returns the exit status; the run's traces are in the files.
-  int RunAsExpected(const GeneratedRun& run) const {
-    const pid_t child = fork();
-    if (child == 0) {
-      setpgid(0, 0);  // a stand-in's Ctrl-C is for this run alone
-      setenv("RUV_CALLS", CallsFile().c_str(), 1);
-      if (std::freopen("/dev/null", "r", stdin) == nullptr || std::freopen("/dev/null", "w", stdout) == nullptr ||
-          std::freopen("/dev/null", "w", stderr) == nullptr || chdir((Directory() + "/cwd").c_str()) != 0) {
-        _exit(125);
-      }
-      _exit(ExpectedRun(run, Directory()).Status());
-    }
-    int status = 0;
-    waitpid(child, &status, 0);
-    return WEXITSTATUS(status);
-  }
-
-  string CallsFile() const { return Directory() + "/calls"; }
-  string SupportList() const { return ReadFile(Directory() + "/data/supportlist.xml"); }
-
-  void Check(const GeneratedRun& run) {
-    LayOut(run);
-    const string list_before = SupportList();
-    const int expected_status = RunAsExpected(run);
-    const string expected_calls = ReadFile(CallsFile());
-    const string expected_list = SupportList();
-
-    LayOut(run);
+  RunResult Start(const GeneratedRun& run) const {
     RunOptions options = Input(run.input);
     options.environment["RUV_CALLS"] = CallsFile();
     options.environment["ZEM_PORTABLE_EXEC_DIR"];
     if (run.portable) options.environment["ZEM_PORTABLE_EXEC_DIR"] = Directory() + "/media";
-    const RunResult result = Run(run.arguments, options);
+    return Run(run.arguments, options);
+  }
 
-    EXPECT_EQ(result.status, expected_status) << result.out;
-    EXPECT_EQ(ReadFile(CallsFile()), expected_calls);
-    EXPECT_EQ(SupportList(), expected_list);
-    EXPECT_EQ(SupportList().substr(0, list_before.size()), list_before);
-
-    const CommandLine line(run.arguments);
+  // Returns how often the application was started.
+  unsigned ExpectCalls(const GeneratedRun& run, const CommandLine& line) const {
     unsigned launches = 0;
     for (const Call& call : CallsIn(ReadFile(CallsFile()))) {
-      if (call.program == "ruv") ++launches;
-      const auto flag = std::find(call.arguments.begin(), call.arguments.end(), "--latest");
-      if (call.program == "ruv") ExpectForwarded(call.arguments);
-      if (call.program == "tavtool") ExpectForwarded({flag, call.arguments.end()});
+      EXPECT_TRUE(call.program == "guihelper.sh" || !(line.help || line.rejected)) << call.program;
+      const auto behind_flags = std::find(call.arguments.begin(), call.arguments.end(), "--latest");
+      if (call.program == "tavtool") ExpectForwarded({behind_flags, call.arguments.end()}, line);
+      if (call.program != "ruv") continue;
+      ++launches;
+      ExpectForwarded(call.arguments, line);
+      string received;
+      for (const string& argument : call.arguments) received += argument + " ";
+      EXPECT_EQ(received, run.noisy ? received : line.Received());
     }
-    EXPECT_LE(launches, line.InUpdateMode() ? 0U : 1U);
-
-    if (fs::is_directory("/var/log/ZEM_Support") && !fs::is_directory(kTraceFile)) {
-      const string trace = ReadFile(kTraceFile);
-      const auto holds_line_feed = [](const string& argument) { return argument.find('\n') != string::npos; };
-      ExpectTraceLines(trace, std::any_of(run.arguments.begin(), run.arguments.end(), holds_line_feed));
-      EXPECT_EQ(trace.rfind(kEarlierTrace, 0) == 0, run.files.count(kTraceFile) != 0);
-      const bool to_the_end = result.status == 0 && !line.help;
-      EXPECT_EQ(EndsWith(trace, "Exiting TAVMaster::~TAVMaster()\n"), to_the_end) << trace;
-    }
-    tally_["update mode"] += line.InUpdateMode() && !line.help && !line.Rejected() ? 1 : 0;
-    tally_["application started"] += launches;
-    tally_["package installed"] += SupportList().size() > list_before.size() ? 1 : 0;
-    tally_["options rejected"] += line.Rejected() && !line.help ? 1 : 0;
-    tally_["tool interrupted"] += result.status == 1 && !line.Rejected() ? 1 : 0;
+    return launches;
   }
+
+  void ExpectTrace(const GeneratedRun& run, bool to_the_end) const {
+    if (!fs::is_directory("/var/log/ZEM_Support") || fs::is_directory(kTraceFile)) return;
+    const string trace = ReadFile(kTraceFile);
+    const auto holds_line_feed = [](const string& argument) { return argument.find('\n') != string::npos; };
+    ExpectTraceLines(trace, std::any_of(run.arguments.begin(), run.arguments.end(), holds_line_feed));
+    EXPECT_EQ(trace.rfind(kEarlierTrace, 0) == 0, run.files.count(kTraceFile) != 0);
+    const ::testing::Matcher<string> ends = EndsWith("[TAVRUV]: [Debug:] Exiting TAVMaster::~TAVMaster()\n");
+    EXPECT_THAT(trace, to_the_end ? ends : Not(ends));
+  }
+
+  void Check(const GeneratedRun& run) {
+    const string list_file = Directory() + "/data/supportlist.xml";
+    LayOut(run);
+    const string list = ReadFile(list_file);
+    const RunResult result = Start(run);
+
+    const CommandLine line(run.arguments);
+    const bool interrupted = result.status == 1 && !line.rejected;
+    EXPECT_EQ(result.status, line.rejected || interrupted ? 1 : 0);
+    const string interrupt = "RUV application is determined by the user!\n";
+    EXPECT_EQ(result.out.find(interrupt) != string::npos, interrupted) << result.out;
+
+    const unsigned launches = ExpectCalls(run, line);
+    const bool declined = result.out.find("Exit RUV\n") != string::npos;
+    const bool due = !line.update_mode && !line.help && result.status == 0 && !declined;
+    EXPECT_LE(launches, due ? 1U : 0U);
+    const bool startable = !run.noisy && fs::is_regular_file(Directory() + "/ruv");
+    EXPECT_GE(launches, due && startable ? 1U : 0U);
+
+    ASSERT_THAT(ReadFile(list_file), StartsWith(list));
+    const string appended = ReadFile(list_file).substr(list.size());
+    EXPECT_THAT(appended, ::testing::AnyOf("", AllOf(StartsWith("\n<MT>"), EndsWith("</MT>"))));
+    EXPECT_TRUE(appended.empty() || result.out.find("Done\n") != string::npos);
+    ExpectTrace(run, result.status == 0 && !line.help);
+
+    tally_["update mode"] += line.update_mode && !line.help && !line.rejected ? 1 : 0;
+    tally_["application started"] += launches;
+    tally_["package installed"] += appended.empty() ? 0 : 1;
+    tally_["options rejected"] += line.rejected ? 1 : 0;
+    tally_["tool interrupted"] += interrupted ? 1 : 0;
+  }
+
+  string CallsFile() const { return Directory() + "/calls"; }
 
   std::map<string, unsigned long> tally_;  // of the runs, by what happened in them
 };

@@ -47,7 +47,7 @@ const Alternatives kToolEnds = {"exit 0",  "exit 32", "exit 21", "exit 52",  "ex
 
 class Generator {
  public:
-  explicit Generator(std::uint64_t seed) : random_(seed), wild_(OneIn(3)) {}
+  explicit Generator(std::uint64_t seed) : random_(seed) { run_.noisy = OneIn(3); }
 
   GeneratedRun Run() {
     DrawArguments();
@@ -73,13 +73,13 @@ class Generator {
           text += "K" + std::to_string(++markers_) + ".";
           break;
         case '^':
-          text += wild_ && OneIn(3) ? DrawSome(kNoise, 6) : Draw(kWords);
+          text += run_.noisy && OneIn(3) ? DrawSome(kNoise, 6) : Draw(kWords);
           break;
         case '&':
           text += Draw(kMachineTypes);
           break;
         case '*':
-          text += wild_ && OneIn(3) ? DrawSome(kNoise, 6) : "";
+          text += run_.noisy && OneIn(3) ? DrawSome(kNoise, 6) : "";
           break;
         default:
           text += c;
@@ -163,7 +163,6 @@ class Generator {
   }
 
   std::mt19937_64 random_;
-  bool wild_;  // noise among the words: the shell may find anything in them, from a comment to a syntax error
   int markers_ = 0;
   GeneratedRun run_;
 };

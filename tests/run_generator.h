@@ -15,6 +15,7 @@ struct GeneratedRun {
   std::map<std::string, std::optional<std::string>> files;
   std::string input;  // standard input, to its end
   bool portable;      // installed in "media" of the application's directory
+  bool noisy;         // the shell may find anything in arguments and identity, from a comment to a syntax error
 };
 
 // What the trace file holds before the run, when it exists.
