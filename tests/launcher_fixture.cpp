@@ -33,10 +33,13 @@ void MakeExecutable(const std::string& path) { fs::permissions(path, fs::perms::
   std::signal(SIGINT, SIG_DFL);
   alarm(kTimeLimit);
   std::string program = launcher;
-  if (options.prelude.empty()) {
+  const char* wrapper = std::getenv("RUV_TEST_WRAPPER");
+  if (options.argv0 || (options.prelude.empty() && wrapper == nullptr)) {
     arguments.insert(arguments.begin(), options.argv0.value_or(launcher));
   } else {
-    arguments.insert(arguments.begin(), {"sh", "-c", options.prelude + "\nexec \"$@\"", "sh", launcher});
+    const std::string words = wrapper == nullptr ? "" : wrapper + std::string(" ");
+    arguments.insert(arguments.begin(),
+                     {"sh", "-c", "set -- " + words + "\"$@\"\n" + options.prelude + "\nexec \"$@\"", "sh", launcher});
     program = "/bin/sh";
   }
   std::vector<char*> argv;
