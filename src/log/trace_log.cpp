@@ -7,14 +7,10 @@
 #include "launcher/command_fragments.h"
 #include "launcher/console.h"
 #include "launcher/tav.h"
+#include "log/trace_format.h"
 
 namespace NZEMRUVTAV {
 namespace {
-
-constexpr const char* kLogDirectory = "/var/log/ZEM_Support";
-constexpr const char* kLogFile = "ruvtav.log";
-constexpr const char* kLinePrefix = "[TAVRUV]: ";
-constexpr std::size_t kMessageBufferSize = 512;  // bytes, the terminating NUL included
 
 bool AppendLine(const std::string& path, const std::string& line) {
   std::FILE* file = std::fopen(path.c_str(), "a+");
