@@ -19,6 +19,10 @@ else()
 endif()
 target_link_options(build_settings INTERFACE -Wl,-z,relro,-z,now)
 
+# What no program uses of the libraries linked into it is left out.
+target_compile_options(build_settings INTERFACE -ffunction-sections -fdata-sections)
+target_link_options(build_settings INTERFACE -Wl,--gc-sections)
+
 # Start-up is faster without the two shared libraries, and the programs run beside an older libstdc++.
 if(RUV_STATIC_RUNTIME)
   target_link_options(build_settings INTERFACE -static-libstdc++ -static-libgcc)

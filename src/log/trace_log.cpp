@@ -12,9 +12,13 @@
 namespace NZEMRUVTAV {
 namespace {
 
+// The longest line fits into the buffer, and so is written at once, by fclose. A buffer of stdio's own would cost an
+// allocation and one more system call for every line.
 bool AppendLine(const std::string& path, const std::string& line) {
+  char buffer[2 * kMessageBufferSize];
   std::FILE* file = std::fopen(path.c_str(), "a+");
   if (file == nullptr) return false;
+  std::setvbuf(file, buffer, _IOFBF, sizeof buffer);
   std::fputs(line.c_str(), file);
   std::fclose(file);
   return true;
