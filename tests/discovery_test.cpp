@@ -10,6 +10,7 @@ using ::testing::EndsWith;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 using ::testing::SizeIs;
+using ::testing::StartsWith;
 
 namespace fs = std::filesystem;
 
@@ -79,7 +80,7 @@ TEST_F(Discovery, EveryOperatingSystemCodeAndItsNeighbours) {
 TEST_F(Discovery, FilesThatCannotBeReadDoNotStopTheRun) {
   fs::remove(kSystemInformationFile);
   RunResult run = Run({"-b"});
-  EXPECT_THAT(run.out, ::testing::StartsWith("WARNING:Unable to get system information!\nYou might need"));
+  EXPECT_THAT(run.out, StartsWith("WARNING:Unable to get system information!\nYou might need"));
   EXPECT_THAT(TraceLines("[Status:]OS = "), ElementsAre("unknown"));
   EXPECT_THAT(TraceLines("[Status:]MT = "), ElementsAre("unknown"));
   EXPECT_THAT(TraceLines("[Status:]ARCH = "), ElementsAre("unknown"));
@@ -136,8 +137,11 @@ TEST_F(Discovery, LauncherDirectory) {
     const std::string message = ("[Status:]Working Path = " + row.working_path).substr(0, 511);
     EXPECT_THAT(TraceLines(WithPlainDirectory(message)), ElementsAre(""));
   }
+  fs::remove(kTraceFile);
+  Run({}, Prelude("set -- bash -c 'exec -a launcher \"$0\" -b' " + long_directory + "/launcher"));
+  EXPECT_THAT(TraceLines("[Status:]Working Path = ").at(0), StartsWith("@/" + long_name + "/" + long_name));
   // The stand-ins were found but for the name in a directory without any, and for the root directory.
-  EXPECT_THAT(CallsOf("ruv"), SizeIs(5));
+  EXPECT_THAT(CallsOf("ruv"), SizeIs(6));
 }
 
 TEST_F(Discovery, NoNameAtAllEndsTheRunWithOneClearLine) {

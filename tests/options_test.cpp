@@ -80,6 +80,7 @@ TEST_F(Options, IdentityForThePackageTool) {
       {{"--chkupd", "-i", "/a-b/9876xyz.xml", "proxy"},
        check + "[-m][9876][-o][rhel5][-a][64][--latest][-i][/a-b/9876xyz.xml][proxy]"},
       {{"--chkupd", "-i", "dir/ab"}, check + "[-m][ab][-o][rhel5][-a][64][--latest][-i][dir/ab]"},
+      {{"--chkupd", "-i", "-555.xml"}, check + "[-m][-555][-o][rhel5][-a][64][--latest][-i][-555.xml]"},
       {{"--chkupd", "-i", "dir/"}, check + "[-m][-o][rhel5][-a][64][--latest][-i][dir/]"},
       {{"--chkupd", "-i"}, check + "[-m][1234][-o][rhel5][-a][64][--latest][-i]"},
       {{"--chkupd", "--update_m", "5678", "-i", "4321"}, check + "[-m][4321][-o][rhel5][-a][64][--latest][-i][4321]"},

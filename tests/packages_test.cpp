@@ -35,6 +35,24 @@ TEST_F(Packages, OnlineCommandsCarryTheForwardedArguments) {
               ElementsAre("\"@/tavtool\" compareweb -l \"@\" -m 1234 -o rhel5 -a 64 --latest 1>/dev/null 2>&1"));
 }
 
+// Each step makes the directories that it needs again, without a trace line but for the download's, and shows what it
+// waits for when it waits.
+TEST_F(Packages, DirectoriesThatGoAwayAndTextsThatWait) {
+  InstallCopyScript();
+  Install("tavtool",
+          "cp ../stdout ../stdout.$1; ls -d /var/ZEM_Support >>../seen\n"
+          "case $1 in acquire) rmdir /var/ZEM_Support ;; comparelocal) rmdir /var/ZEM_Support; exit 21 ;; esac");
+  Run({"--update"});
+  EXPECT_THAT(CallsOf("tavtool"), ::testing::SizeIs(4));
+  EXPECT_EQ(ReadFile(Directory() + "/seen"), "/var/ZEM_Support\n/var/ZEM_Support\n/var/ZEM_Support\n");
+  const std::string trace = Trace();
+  EXPECT_THAT(trace, HasSubstr("AcquireUpdate: command = mkdir"));
+  EXPECT_EQ(trace.find("mkdir"), trace.rfind("mkdir"));
+  EXPECT_THAT(ReadFile(Directory() + "/stdout.acquire"), ::testing::EndsWith("please wait...\n"));
+  EXPECT_THAT(ReadFile(Directory() + "/stdout.expand"),
+              ::testing::EndsWith("downloading...Applying update(s) please wait..."));
+}
+
 TEST_F(Packages, VersionHandedToTheCopyScript) {
   fs::create_directory(kRepository);
   InstallCopyScript();

@@ -179,7 +179,8 @@ class Property : public LauncherTest {
       ExpectForwarded(call.arguments, line);
       string received;
       for (const string& argument : call.arguments) received += argument + " ";
-      EXPECT_EQ(received, run.noisy ? received : line.Received());
+      if (run.noisy) continue;
+      EXPECT_EQ(received, line.Received());
     }
     return launches;
   }

@@ -108,6 +108,8 @@ TEST_F(RunSequence, UpdateModeStopsWhereAStepFailsAndNeverStartsTheApplication) 
       {"download fails", "--update", false, {{"acquire", 77}}, detected + "Failed\n", download, false},
       {"download fails, with a message", "--update", false, {{"acquire", 45}}, no_kro, download, false},
       {"nothing newer", "--update", false, {{"compareweb", 32}, {"acquire", 32}}, detected + "Done\n", compare, false},
+      {"latest", "--update", false, {{"comparelocal", 30}}, detected + latest + "Done\n", compare, false},
+      {"no payload", "--update", false, {{"comparelocal", 52}}, detected + "Done\n", compare, false},
       {"installed", "--Update", false, {{"comparelocal", 21}}, applying + "Done\nDone\n", all, true},
       {"expansion fails", "--update", false, {{"comparelocal", 21}, {"expand", 51}}, corrupted, all, false},
       {"portable", "--update", true, {{"comparelocal", 21}}, detected + "Done\n", download, false},
@@ -154,6 +156,7 @@ TEST_F(RunSequence, LaunchModeLooksForPackagesOnlyWhereItMay) {
     TearDown();
     SetUp();
     if (row.repository) fs::create_directory(kRepository);
+    InstallTool({{"comparelocal", 52}});  // no payload is nothing to install here
     const RunResult run = Run(row.arguments);
     EXPECT_EQ(run.out, "");
     Strings verbs;
@@ -220,8 +223,17 @@ TEST_F(RunSequence, WhatTheParentLeftOrTheConsoleDoesIsNoFailure) {
   Install("ruv", "kill -PIPE $$; echo ignored >'" + Directory() + "/survived'");
   EXPECT_EQ(Run({}, Prelude("mkfifo pipe; sleep 0.2 <pipe & exec >pipe; wait")).status, 0);
   EXPECT_EQ(ReadFile(Directory() + "/survived"), "");
-  // No standard streams at all.
-  EXPECT_EQ(Run({"-x"}, Prelude("exec <&- >&- 2>&-")).status, 0);
-  EXPECT_THAT(CallsOf("ruv"), ElementsAre("", "", "[-x]"));
+  // A parent that ignores SIGPIPE wants that for all.
+  Install("ruv", "sed -n 's/^SigIgn:.*\\(....\\)$/\\1/p' /proc/$$/status >'" + Directory() + "/ignored'");
+  Run({}, Prelude("trap '' PIPE"));
+  EXPECT_EQ(ReadFile(Directory() + "/ignored"), "1000\n");
+  Run({});
+  EXPECT_EQ(ReadFile(Directory() + "/ignored"), "0000\n");
+  EXPECT_EQ(Run({}, Prelude("ulimit -f 0")).status, 0);
+  // Without standard output a file that is opened gets its descriptor. Then without any stream at all.
+  Install("ruv");
+  fs::remove(Directory() + "/calls.ruv");
+  for (const char* closed : {"exec >&-", "exec <&- >&- 2>&-"}) EXPECT_EQ(Run({"-x"}, Prelude(closed)).status, 0);
+  EXPECT_THAT(CallsOf("ruv"), ElementsAre("[-x]", "[-x]"));
   EXPECT_THAT(Trace(), Not(HasSubstr("You already have the latest version RUV.\n[TAVRUV]: You")));
 }

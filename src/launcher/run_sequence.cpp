@@ -3,15 +3,9 @@
 #include "launcher/console.h"
 #include "launcher/tav.h"
 #include "log/trace_scope.h"
+#include "packages/exit_code_tables.h"
 
 namespace NZEMRUVTAV {
-namespace {
-
-// Results of the package steps, as HandleTAVToolReturnValue makes them.
-constexpr int kSuccess = 0;
-constexpr int kPackageToInstall = 2;
-
-}  // namespace
 
 int TAVMaster::TAVMasterMain(int argc, char** argv) {
   const TraceScope trace(*this, "TAVMasterMain");

@@ -45,6 +45,8 @@ std::string TAVMaster::Quoted(std::string path) const {
   return path;
 }
 
+std::string TAVMaster::PortableUpdateFolder() const { return portablePath + kFileSeparator + "update"; }
+
 void TAVMaster::EnsureDirectory(const std::string& path, const std::string& redirection, const char* traced_by) const {
   if (DirExists(path)) return;
   std::string command = MKDIR + kSpaceSeparator + path;

@@ -73,7 +73,7 @@ class TAVMaster {
   // Sets operatingSystemType to the package tool's name for an operating-system code; a code that the table does not
   // list changes nothing.
   void OSMapping(int code);
-  // True when ZEM_PORTABLE_EXEC_DIR named a directory. Writes one status line on every call.
+  // True when ZEM_PORTABLE_EXEC_DIR was set and not empty. Writes one status line on every call.
   bool isPortableRUV() const;
 
   // ---- Trace log ----------------------------------------------------------------------------------------------------
@@ -156,6 +156,8 @@ class TAVMaster {
 
   // Returns the path in double quotes.
   std::string Quoted(std::string path) const;
+  // Returns the folder of a portable installation that holds its packages.
+  std::string PortableUpdateFolder() const;
   // Builds the command line that a tool call describes: the one place where tavtool commands are put together.
   std::string ToolCommand(const ToolCall& call) const;
 

@@ -11,8 +11,6 @@
 namespace NZEMRUVTAV {
 namespace {
 
-// Where the shell puts the tool's output (OutputToLog).
-constexpr const char* kToolOutputFile = "tav.log";
 constexpr std::string_view kVersionKey = "Version=";
 constexpr std::size_t kVersionLength = 4;
 
@@ -32,7 +30,7 @@ bool SkipBehindKey(std::FILE* file) {
 // Sets the version to the (at most) four characters behind the first key, up to the end of their line. Leaves it alone
 // when there is no key, no file, or a read error before that.
 void ReadPackageVersion(std::string& version) {
-  std::FILE* file = std::fopen(kToolOutputFile, "r");
+  std::FILE* file = std::fopen(kToolOutputFile.c_str(), "r");
   if (file == nullptr) return;
   if (SkipBehindKey(file)) {
     std::string text;

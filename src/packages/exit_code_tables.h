@@ -4,13 +4,19 @@
 
 namespace NZEMRUVTAV {
 
+// What a package step makes of an exit code, and returns.
+inline constexpr int kSuccess = 0;
+inline constexpr int kFailure = 1;  // every code that is not in kToolResults
+inline constexpr int kPackageToInstall = 2;
+inline constexpr int kNoPayload = 3;
+
 struct ToolResult {
   int exit_code;
   int result;
 };
 
-// The codes that are no error. Results: 0 success, 2 a package to install, 3 no payload.
-inline constexpr ToolResult kToolResults[] = {{32, 0}, {0, 0}, {21, 2}, {52, 3}, {61, 3}};
+inline constexpr ToolResult kToolResults[] = {
+    {32, kSuccess}, {0, kSuccess}, {21, kPackageToInstall}, {52, kNoPayload}, {61, kNoPayload}};
 
 struct ErrMsg {
   int exit_code;

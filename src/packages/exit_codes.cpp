@@ -8,8 +8,6 @@
 namespace NZEMRUVTAV {
 namespace {
 
-constexpr int kFailure = 1;
-
 // The wait status of a shell that the interrupt signal (2) ended. A tool that exits with code 2 has status 512.
 constexpr int kInterruptedStatus = 2;
 

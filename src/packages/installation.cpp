@@ -6,14 +6,11 @@
 #include "launcher/shell.h"
 #include "launcher/tav.h"
 #include "log/trace_scope.h"
+#include "packages/exit_code_tables.h"
 #include "packages/tool_command.h"
 
 namespace NZEMRUVTAV {
 namespace {
-
-// Results of HandleTAVToolReturnValue that let the installation go on.
-constexpr int kExpanded = 0;
-constexpr int kNoPayload = 3;
 
 // Stands in for the package source when the tool found no payload.
 constexpr const char* kNoPayloadMarker = "NO_TAV_PAYLOAD";
@@ -37,7 +34,7 @@ int TAVMaster::DecompressTAV(std::string repository_path, std::string expansion_
   Print("Applying update(s) please wait...");
   FlushConsole();
   const int result = HandleTAVToolReturnValue(RunInShell(command));
-  if (result != kExpanded && result != kNoPayload) return 1;
+  if (result != kSuccess && result != kNoPayload) return 1;
 
   const std::string package_source = result == kNoPayload ? kNoPayloadMarker : repository_path;
   if (CopyTAVToRUVFoler(package_source, expansion_path, GetWorkingPath()) == 0) {

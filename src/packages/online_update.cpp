@@ -20,8 +20,7 @@ int TAVMaster::CheckUpdate() {
 
 int TAVMaster::AcquireUpdate() {
   const TraceScope trace(*this, "AcquireUpdate");
-  const std::string download_path =
-      isPortableRUV() ? GetPortablePath() + kFileSeparator + "update" : GetRepositoryPath();
+  const std::string download_path = isPortableRUV() ? PortableUpdateFolder() : GetRepositoryPath();
   EnsureDirectory(download_path, OutputToNULL, "AcquireUpdate");
   ToolCall download;
   download.verb = TAVTOOL_CMD_ACQUIRE;

@@ -9,7 +9,7 @@ namespace NZEMRUVTAV {
 
 int TAVMaster::CopyPortableTAVToRepository() {
   const TraceScope trace(*this, "CopyPortableTAVToRepository");
-  const std::string update_folder = GetPortablePath() + kFileSeparator + "update";
+  const std::string update_folder = PortableUpdateFolder();
   if (!DirExists(update_folder)) {
     DebugLog("[Status:]CopyPortableTAVToRepository: The directory <Portable>/update does not Exist!");
     return 1;

@@ -4,6 +4,7 @@
 #include <initializer_list>
 
 #include "log/trace_format.h"
+#include "packages/exit_code_tables.h"
 
 namespace ruv_trace {
 namespace {
@@ -146,7 +147,8 @@ void Run::TakeToolExit(int exit_code) {
   awaits_tool_exit_ = false;
   calls.back().exit_code = exit_code;
   const int result = calls.back().Result();
-  if (where_ == kExpansion) package = result == 0 || result == 3 ? kExpanded : kNotExpanded;
+  if (where_ == kExpansion)
+    package = result == NZEMRUVTAV::kSuccess || result == NZEMRUVTAV::kNoPayload ? kExpanded : kNotExpanded;
 }
 
 void Run::TakeCommand(std::string_view text) {
@@ -166,7 +168,9 @@ std::string_view Run::Mode() const {
   if (Entered(kDownload)) return "update";
   // Both modes begin with the online check, and only the successful one of an update goes on from there.
   if (Entered(kCheck)) {
-    return finished_ && !lines_missing && !calls.empty() && calls[0].Result() == 0 ? "check" : "check or update";
+    return finished_ && !lines_missing && !calls.empty() && calls[0].Result() == NZEMRUVTAV::kSuccess
+               ? "check"
+               : "check or update";
   }
   if (Entered(kLaunch) || Entered(kImport)) return "launch";
   return !lines_missing && portable_tested_ ? "launch" : "";

@@ -5,11 +5,6 @@
 namespace ruv_trace {
 namespace {
 
-constexpr int kSuccess = 0;
-constexpr int kPackageToInstall = 2;
-constexpr int kNoPayload = 3;
-constexpr int kFailure = 1;
-
 // What the message table has no words for: exit codes of the shell, and of a shell that could not be started.
 constexpr NZEMRUVTAV::ErrMsg kNotRun[] = {
     {-1, "no shell could be started"},
@@ -38,17 +33,17 @@ int ToolCall::Result() const {
   for (const NZEMRUVTAV::ToolResult& known : NZEMRUVTAV::kToolResults) {
     if (known.exit_code == exit_code) return known.result;
   }
-  return kFailure;
+  return NZEMRUVTAV::kFailure;
 }
 
 std::string_view ToolCall::Meaning() const {
   if (!exit_code) return "no exit code";
   switch (Result()) {
-    case kSuccess:
+    case NZEMRUVTAV::kSuccess:
       return SuccessOf(verb);
-    case kPackageToInstall:
+    case NZEMRUVTAV::kPackageToInstall:
       return "newer package";
-    case kNoPayload:
+    case NZEMRUVTAV::kNoPayload:
       return "no payload";
     default:
       break;
