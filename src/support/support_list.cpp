@@ -76,9 +76,11 @@ int TAVMaster::UpdateSupportList() {
     return 0;
   }
   std::fputc('\n', file);
-  std::fflush(file);
-  const std::string entry = std::string(kOpeningTag) + machineType + std::string(kClosingTag);
-  std::fwrite(entry.data(), 1, entry.size(), file);
+  // Without its line feed the entry would stand behind the last line, where no reader finds it.
+  if (std::fflush(file) == 0) {
+    const std::string entry = std::string(kOpeningTag) + machineType + std::string(kClosingTag);
+    std::fwrite(entry.data(), 1, entry.size(), file);
+  }
   std::fclose(file);
   return 1;
 }
