@@ -6,9 +6,9 @@ loader, before the program's own first one, are left alone, and so are those of 
 An error with a "+" stands for trouble that stays: that call fails and every later one of its kind.
 
 Builds the launcher and installs what is missing. Runs in private views of the file system, one for each core.
-A full run takes about four minutes on two cores, --short about ten seconds.
+A full run takes 2 to 5 minutes on two cores, --short 10 to 20 seconds.
 
-Exit status: 0 nothing fell short, 1 something did, 77 strace cannot trace here and nothing was run, 125 no private view.
+Exit status: 0 nothing fell short, 1 something did; nothing was run: 77 strace cannot trace here, 125 no private view.
 """
 import argparse
 import collections
@@ -28,7 +28,7 @@ from typing import NamedTuple
 CHECKOUT = Path(__file__).resolve().parent.parent
 EXIT_CANNOT_TRACE = 77
 BOUND = 10  # seconds that a run may take; it takes a fraction of one
-SHORT_RUNS = 10  # runs of --short for each call of a scenario, at most
+KIND = 32  # characters of a line of strace; --short fails the first and the last call of those that begin alike
 
 # The calls that fail, and with what. Calls in one row take turns, calls joined by a "," fail together.
 FAULTS = (
@@ -138,6 +138,7 @@ def all_faults():
 
 class Learnt(NamedTuple):
     calls: list  # the names of all calls of a run without faults, in order
+    kinds: list  # and how strace's lines about them begin: alike for most lines of the trace
     own: int  # where among them the program's own begin,
     main_begins: int  # and those of its main
     wrong: list  # what fell short without a fault
@@ -176,6 +177,7 @@ class Installation:
     def run(self, scenario, strace_options):
         self.reset(scenario)
         log = self.directory / "strace.log"
+        log.write_text("")  # what is in it afterwards is this run's
         program = str(self.application / "launcher")
         environment = {"PATH": os.environ["PATH"]}
         if scenario.portable:
@@ -200,8 +202,9 @@ class Installation:
             process.wait()
             os.close(all_gone)
         lines = log.read_text(errors="replace").splitlines()
-        ending = re.match(r"\+\+\+ (.*) \+\+\+", lines[-1]) if in_time and lines else None
-        return Outcome(ending[1] if ending else "", lines, self.read("console"), self.read(TRACE),
+        told = re.match(r"\+\+\+ (.*) \+\+\+", lines[-1] if lines else "")
+        ending = told[1] if told else "strace told no ending" if in_time else ""
+        return Outcome(ending, lines, self.read("console"), self.read(TRACE),
                        self.read(self.support_list), self.read(self.starts).count("started"))
 
     def read(self, name):
@@ -250,25 +253,30 @@ def learn(installation, scenario):
         wrong.append("no package installed" if scenario.installs else "package installed")
     if ("(Y/N)" in outcome.console) == scenario.installs:
         wrong.append("question asked" if scenario.installs else "question not asked")
-    calls = [match[1] for match in (re.match(r"(\w+)\(", line) for line in outcome.log) if match]
+    lines = [line for line in outcome.log if re.match(r"\w+\(", line)]
+    calls = [line.split("(")[0] for line in lines]
     known = {call for fault in all_faults() for call in fault.calls} | CANNOT_FAIL
     # Preparing the signals is the first act of main; the loader's last one, before the program's static objects, is to
     # protect its data and to let go of its cache.
     main_begins = calls.index("rt_sigaction")
     own = max(at for at in range(main_begins) if calls[at] in ("mprotect", "prlimit64", "munmap")) + 1
     wrong += [f"{call} has no row in FAULTS" for call in sorted(set(calls[own:]) - known)]
-    return Learnt([] if wrong else calls, own, main_begins, wrong)
+    return Learnt([] if wrong else calls, [line[:KIND] for line in lines], own, main_begins, wrong)
 
 
-def positions_of(fault, learnt, short):
-    """Where in the run the fault strikes, one run for each; the last one of a full run strikes nowhere."""
+def positions_of(fault, learnt, short, turn):
+    """Where in the run the fault strikes, one run for each; the last one of a full run strikes nowhere.
+
+    In a short run the errors of a call take turns, beginning with another one in each scenario."""
     begin = learnt.main_begins if fault.error == "ENOMEM+" else learnt.own  # nobody can say that before main
     positions = [at for at in range(begin, len(learnt.calls)) if learnt.calls[at] in fault.calls]
     if not short:
         return positions + [len(learnt.calls)] if positions else []
-    spread = positions[:: max(1, -(-len(positions) // SHORT_RUNS))]
+    first = {learnt.kinds[at]: at for at in reversed(positions)}
+    last = {learnt.kinds[at]: at for at in positions}
+    spread = sorted({*first.values(), *last.values()})
     errors = [other.error for other in all_faults() if other.calls == fault.calls]
-    return spread[errors.index(fault.error) :: len(errors)]
+    return spread[(errors.index(fault.error) + 3 * turn) % len(errors) :: len(errors)]
 
 
 def run_share(options):
@@ -285,7 +293,7 @@ def run_share(options):
                 if learnt[scenario].wrong:
                     tell(scenario, *NO_FAULT, 0, learnt[scenario].wrong)
             calls = learnt[scenario].calls
-            for nth, position in enumerate(positions_of(fault, learnt[scenario], options.short), 1):
+            for position in positions_of(fault, learnt[scenario], options.short, SCENARIOS.index(scenario)):
                 outcome = installation.run(scenario, fault.strace_options(calls, position))
                 injected = any("(INJECTED)" in line for line in outcome.log)
                 if position == len(calls) and not injected:
@@ -294,6 +302,7 @@ def run_share(options):
                                              fault.calls))
                 if injected != (position < len(calls)):
                     wrong.append("other calls than in the run without faults")
+                nth = sum(call in fault.calls for call in calls[learnt[scenario].own : position + 1])
                 tell(scenario, fault.label, fault.error, nth, wrong)
 
 
@@ -325,8 +334,8 @@ def prepare():
         build = subprocess.run(command, stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
         if build.returncode != 0:
             sys.exit(f"{build.stdout}The build failed, see above.")
-    attempt = subprocess.run(["scripts/private-view", "strace", "-o", "/dev/null", "--inject=getpid:error=EPERM", "true"],
-                             stdout=subprocess.DEVNULL, stderr=subprocess.PIPE, text=True)
+    trial = ["strace", "-o", "/dev/null", "--inject=getpid:error=EPERM", "true"]
+    attempt = subprocess.run(["scripts/private-view", *trial], stderr=subprocess.PIPE, text=True)
     if attempt.returncode == 125:
         sys.stderr.write(attempt.stderr)
         sys.exit(125)
@@ -347,18 +356,22 @@ def print_table(results, seconds):
         notes = "; ".join(f"{text} ({count})" for text, count in short[row].items()) or "-"
         print(f"{row[0]:<16}{row[1]:<9}{runs[row]:>6}  {notes}")
     fallen = [result for result in results if result[4]]
-    print(f"\n{len(results)} runs in {seconds:.0f} s, {len(fallen)} fell short. A + behind an error: it stays until the end.")
-    for scenario, call, error, nth, wrong in fallen[:20]:
-        print(f"  {scenario}: {call} no. {nth} with {error}: {'; '.join(wrong)}")
-    if len(fallen) > 20:
-        print(f"  ... and {len(fallen) - 20} more")
+    print(f"\n{len(results)} runs in {seconds:.0f} s, {len(fallen)} fell short (+: the error stays until the end)")
+    findings = sorted({
+        f"  {scenario}: {f'{call} no. {nth} with {error}' if nth else 'without a fault'}: {'; '.join(wrong)}"
+        for scenario, call, error, nth, wrong in fallen})
+    for finding in findings[:20]:
+        print(finding)
+    if len(findings) > 20:
+        print(f"  ... and {len(findings) - 20} more")
     return 1 if fallen or not results else 0
 
 
 def main():
     parser = argparse.ArgumentParser(prog="scripts/torture", description=__doc__,
                                      formatter_class=argparse.RawDescriptionHelpFormatter)
-    parser.add_argument("--short", action="store_true", help="a selection, spread over calls and errors")
+    parser.add_argument("--short", action="store_true",
+                        help="a selection: the first and the last one of like calls, the errors in turn")
     parser.add_argument("--only", metavar="CALL", help="fail this system call only, such as write")
     parser.add_argument("--share", nargs=2, type=int, help=argparse.SUPPRESS)  # worker: which share, of how many
     options = parser.parse_args()
