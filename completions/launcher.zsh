@@ -15,7 +15,7 @@ _arguments \
   '--proxy-port=[port of the proxy server]:port:' \
   '--proxy-user=[user at the proxy server]:user:' \
   '--proxy-password=[password at the proxy server]:password:' \
-  '--show_stderr[keep the standard error of the programs that are run]' \
+  '--show_stderr[keep the standard error of the application]' \
   '--gui[accepted, changes nothing]' \
   '--cmd[accepted, changes nothing]' \
   '-b[batch mode: ask nothing]' \

@@ -150,6 +150,8 @@ TEST_F(RuvTrace, FilesAndOptions) {
   EXPECT_THAT(
       Report("/none /tmp " + std::string(kTraceFile)),
       AllOf(HasSubstr("read /none: "), HasSubstr("read /tmp: "), HasSubstr(": run 2, "), HasSubstr("\nstatus 1")));
+  EXPECT_EQ(system(("gzip -k " + std::string(kTraceFile)).c_str()), 0);
+  EXPECT_THAT(Report(kTraceFile + std::string(".gz")), AllOf(HasSubstr("is compressed"), HasSubstr("status 1")));
   EXPECT_THAT(Report("--jason"), HasSubstr("status 2"));
   EXPECT_THAT(Report(">/dev/full"), HasSubstr("status 1"));
 }

@@ -33,7 +33,8 @@ the FILEs, "-" for standard input, or %s.
 
 A line shows, where the trace does:
 - the number of the run, and the line of the file where it begins;
-- the machine type, operating system and architecture that the run used;
+- the machine type, operating system and architecture, as found on the machine
+  or, where it differs, as given to tavtool;
 - what it did: launch, check or update;
 - each call of tavtool with its exit code and what that means (under some
   shells the code is 0 also when a signal ended tavtool);
@@ -52,7 +53,8 @@ JSON, "command_cut" is true).
 
 The trace may hold any bytes. Control characters and invalid UTF-8 are shown as
 \xHH; in JSON, U+FFFD stands for invalid UTF-8. Each FILE is read by itself; for
-runs that go on in the next file: cat OLD NEW | ruv-trace -
+runs that go on in the next file: cat OLD NEW | ruv-trace -. A compressed FILE
+is refused: zcat FILE | ruv-trace -
 
 Exit status: 0; 1 when a file cannot be read or the output cannot be written;
 2 for a wrong option.
@@ -60,11 +62,23 @@ Exit status: 0; 1 when a file cannot be read or the output cannot be written;
 
 std::string DefaultFile() { return std::string(NZEMRUVTAV::kLogDirectory) + "/" + NZEMRUVTAV::kLogFile; }
 
-// Reports the runs of one file. Returns false, with a message, when it cannot be opened or read to its end.
+// Whether the file begins as a rotated trace does once it is compressed. False for what cannot be read twice.
+bool IsCompressed(int descriptor) {
+  unsigned char magic[2] = {};
+  return pread(descriptor, magic, sizeof magic, 0) == sizeof magic && magic[0] == 0x1F && magic[1] == 0x8B;
+}
+
+// Reports the runs of one file. Returns false, with a message, when it cannot be opened or read to its end, or is
+// compressed.
 bool ReportFile(const std::string& file, bool json, bool name_file) {
   const bool standard_input = file == "-";
   const int descriptor = standard_input ? STDIN_FILENO : open(file.c_str(), O_RDONLY | O_CLOEXEC);
   int error = descriptor < 0 ? errno : 0;
+  if (descriptor >= 0 && IsCompressed(descriptor)) {
+    std::fprintf(stderr, "ruv-trace: %s is compressed: use zcat %s | ruv-trace -\n", file.c_str(), file.c_str());
+    if (!standard_input) close(descriptor);
+    return false;
+  }
   if (descriptor >= 0) {
     const std::string heading = name_file ? Printable(file) + ": " : "";
     TraceReader reader(

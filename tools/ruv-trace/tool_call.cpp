@@ -42,9 +42,9 @@ std::string_view ToolCall::Meaning() const {
     case NZEMRUVTAV::kSuccess:
       return SuccessOf(verb);
     case NZEMRUVTAV::kPackageToInstall:
-      return "newer package";
+      return verb == "comparelocal" ? "newer package" : "unexpected code";
     case NZEMRUVTAV::kNoPayload:
-      return "no payload";
+      return verb == "expand" || verb == "comparelocal" ? "no payload" : "unexpected code";
     default:
       break;
   }
