@@ -5,10 +5,10 @@ of these calls and each error that fits it, the run is repeated with that one ca
 loader, before the program's own first one, are left alone, and so are those of the programs that the launcher runs.
 An error with a "+" stands for trouble that stays: that call fails and every later one of its kind.
 
-Builds the launcher and installs what is missing. Runs in private views of the file system, one for each core.
+Builds the launcher and installs what is missing. Runs in sandboxes, one for each core.
 A full run takes 2 to 5 minutes on two cores, --short 10 to 20 seconds.
 
-Exit status: 0 nothing fell short, 1 something did; nothing was run: 77 strace cannot trace here, 125 no private view.
+Exit status: 0 nothing fell short, 1 something did; nothing was run: 77 strace cannot trace here, 125 no sandbox.
 """
 import argparse
 import collections
@@ -145,11 +145,11 @@ class Learnt(NamedTuple):
 
 
 class Installation:
-    """The launcher with stand-ins for the other programs, laid out in the private view that this process runs in."""
+    """The launcher with stand-ins for the other programs, laid out in the sandbox that this process runs in."""
 
     def __init__(self, directory):
-        if "RUV_PRIVATE_VIEW" not in os.environ:
-            sys.exit("This part of torture.py runs in a private view only.")
+        if "RUV_SANDBOX" not in os.environ:
+            sys.exit("This part of torture.py runs in a sandbox only.")
         self.directory = Path(directory)
         self.application = self.directory / "ruv"
         (self.application / "data").mkdir(parents=True)
@@ -316,7 +316,7 @@ def collect(options):
     told, telling = os.pipe()
     arguments = (["--short"] if options.short else []) + (["--only", options.only] if options.only else [])
     shares = os.cpu_count() or 1
-    workers = [subprocess.Popen([CHECKOUT / "scripts/private-view", sys.executable, __file__, *arguments,
+    workers = [subprocess.Popen([CHECKOUT / "scripts/sandbox", sys.executable, __file__, *arguments,
                                  "--share", str(share), str(shares)], stdout=telling) for share in range(shares)]
     os.close(telling)
     with os.fdopen(told) as lines:
@@ -335,7 +335,7 @@ def prepare():
         if build.returncode != 0:
             sys.exit(f"{build.stdout}The build failed, see above.")
     trial = ["strace", "-o", "/dev/null", "--inject=getpid:error=EPERM", "true"]
-    attempt = subprocess.run(["scripts/private-view", *trial], stderr=subprocess.PIPE, text=True)
+    attempt = subprocess.run(["scripts/sandbox", *trial], stderr=subprocess.PIPE, text=True)
     if attempt.returncode == 125:
         sys.stderr.write(attempt.stderr)
         sys.exit(125)

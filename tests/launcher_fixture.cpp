@@ -63,7 +63,7 @@ std::string ReadFile(const std::string& path) {
 }
 
 void LauncherTest::SetUp() {
-  ASSERT_NE(std::getenv("RUV_PRIVATE_VIEW"), nullptr) << "run these tests through scripts/private-view or ctest";
+  ASSERT_NE(std::getenv("RUV_SANDBOX"), nullptr) << "run these tests through scripts/sandbox or ctest";
   for (const char* path : {"/var/log/ZEM_Support", "/var/log/TAV_Support", kRepository, kExpansionDirectory}) {
     fs::remove_all(path);
   }

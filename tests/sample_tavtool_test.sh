@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # The stand-in for the package tool on real packages: its exit codes, and what it leaves in the directories.
-# Run in a private view, as ctest does it.
+# Run in a sandbox, as ctest does it.
 set -uo pipefail
 sample=$(cd "$(dirname "${BASH_SOURCE[0]}")/../sample" && pwd)
 cd "$(mktemp -d)" || exit 1
