@@ -51,17 +51,6 @@ void MakeExecutable(const std::string& path) { fs::permissions(path, fs::perms::
 
 }  // namespace
 
-void WriteFile(const std::string& path, const std::string& text) {
-  fs::create_directories(fs::path(path).parent_path());
-  std::ofstream(path, std::ios::binary) << text;
-}
-
-std::string ReadFile(const std::string& path) {
-  std::ostringstream text;
-  text << std::ifstream(path, std::ios::binary).rdbuf();
-  return text.str();
-}
-
 void LauncherTest::SetUp() {
   ASSERT_NE(std::getenv("RUV_SANDBOX"), nullptr) << "run these tests through scripts/sandbox or ctest";
   for (const char* path : {"/var/log/ZEM_Support", "/var/log/TAV_Support", kRepository, kExpansionDirectory}) {
@@ -72,7 +61,7 @@ void LauncherTest::SetUp() {
   fs::create_directory(directory_ + "/cwd");
   fs::copy_file(LAUNCHER_EXE, directory_ + "/launcher");
   for (const char* program : {"ruv", "tavtool", "guihelper.sh"}) Install(program);
-  WriteFile(kSystemInformationFile, "ZEM_SYSTEM_OS=203\nZEM_SYSTEM_MT=1234\nZEM_SYSTEM_ARCH=64\n");
+  WriteFile(::kSystemInformationFile, "ZEM_SYSTEM_OS=203\nZEM_SYSTEM_MT=1234\nZEM_SYSTEM_ARCH=64\n");
   WriteFile(directory_ + "/data/supportlist.xml", "<MT>1234</MT>\n");
 }
 

@@ -3,34 +3,7 @@
 #ifndef RUV_TESTS_LAUNCHER_FIXTURE_H
 #define RUV_TESTS_LAUNCHER_FIXTURE_H
 
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
-
-#include <map>
-#include <optional>
-#include <string>
-#include <vector>
-
-using Strings = std::vector<std::string>;
-
-struct RunOptions {
-  std::string input;                                              // standard input, to its end
-  std::map<std::string, std::optional<std::string>> environment;  // no value: the variable is taken away
-  std::optional<std::string> argv0;                               // the name to start under, not the full path
-  std::string prelude;                                            // shell text that is run just before the launcher
-};
-inline RunOptions Input(const std::string& text) { return {text, {}, {}, ""}; }
-inline RunOptions Environment(const std::string& name, const std::optional<std::string>& value) {
-  return {"", {{name, value}}, {}, ""};
-}
-inline RunOptions StartedAs(const std::string& argv0) { return {"", {}, argv0, ""}; }
-inline RunOptions Prelude(const std::string& shell_text) { return {"", {}, {}, shell_text}; }
-
-struct RunResult {
-  int status = -1;  // exit status; 1000 + N when signal N ended the launcher
-  std::string out;  // standard output and, in the order of writing, standard error
-};
-
+#include "installation.h"
 class LauncherTest : public ::testing::Test {
  protected:
   static constexpr const char* kTraceFile = "/var/log/ZEM_Support/ruvtav.log";
@@ -68,8 +41,5 @@ class LauncherTest : public ::testing::Test {
  private:
   std::string directory_;
 };
-
-void WriteFile(const std::string& path, const std::string& text);
-std::string ReadFile(const std::string& path);  // empty when it is no file
 
 #endif  // RUV_TESTS_LAUNCHER_FIXTURE_H

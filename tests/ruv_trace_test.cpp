@@ -5,7 +5,7 @@
 #include <regex>
 #include <sstream>
 
-#include "launcher_fixture.h"
+#include "installation.h"
 
 using ::testing::AllOf;
 using ::testing::AnyOf;
@@ -14,8 +14,10 @@ using ::testing::Not;
 
 namespace fs = std::filesystem;
 
-class RuvTrace : public LauncherTest {
+class RuvTrace : public ::testing::Test, protected Installation {
  protected:
+  using Installation::Run;  // not the test's own
+
   // What ruv-trace prints on both outputs, and its exit status where that is not 0.
   std::string Report(const std::string& arguments = "") const {
     std::string text;

@@ -1,0 +1,180 @@
+#include "installation.h"
+
+#include <fcntl.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <csignal>
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
+
+namespace fs = std::filesystem;
+
+namespace {
+
+constexpr unsigned kTimeLimit = 20;  // seconds
+
+// The directories that a run of the launcher may make: the second words of the file's entries.
+Strings LauncherDirectories() {
+  std::ifstream file(TMPFILES_CONF);
+  Strings directories;
+  for (std::string type, path, rest; file >> type && std::getline(file >> path, rest);) {
+    if (type == "d") directories.push_back(path);
+  }
+  return directories;
+}
+
+std::string RecordingProgram(const std::string& record, const std::string& then) {
+  return "#!/bin/sh\n{ for argument; do printf '[%s]' \"$argument\"; done; echo; } >>'" + record + "'\n" + then + "\n";
+}
+
+const char* Wrapper() { return std::getenv("RUV_TEST_WRAPPER"); }
+
+int OpenTerminal() {
+  const int terminal = posix_openpt(O_RDWR | O_CLOEXEC | O_NOCTTY);
+  grantpt(terminal);
+  unlockpt(terminal);
+  return terminal;
+}
+
+void TypeAfterTheQuestion(int terminal, const std::string& text, const std::string& output) {
+  for (int wait = 0; wait < 1000 && ReadFile(output).find("(Y/N)") == std::string::npos; ++wait) usleep(10'000);
+  EXPECT_EQ(write(terminal, text.data(), text.size()), static_cast<ssize_t>(text.size()));
+}
+
+[[noreturn]] void ExecuteLauncher(const std::string& launcher, Strings arguments, const RunOptions& options,
+                                  const std::string& input, const std::string& output, const std::string& directory) {
+  for (const auto& [name, value] : options.environment) {
+    value ? setenv(name.c_str(), value->c_str(), 1) : unsetenv(name.c_str());
+  }
+  const int in = open(input.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY | (options.terminal ? O_NONBLOCK : 0));
+  const int out = open(output.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
+  if (in < 0 || out < 0 || chdir(directory.c_str()) != 0) _exit(125);
+  dup2(in, STDIN_FILENO);
+  dup2(out, STDOUT_FILENO);
+  dup2(out, STDERR_FILENO);
+  setpgid(0, 0);
+  std::signal(SIGINT, SIG_DFL);
+  alarm(kTimeLimit);
+  std::string program = launcher;
+  if (options.argv0 || (options.prelude.empty() && Wrapper() == nullptr)) {
+    arguments.insert(arguments.begin(), options.argv0.value_or(launcher));
+  } else {
+    const std::string words = Wrapper() == nullptr ? "" : Wrapper() + std::string(" ");
+    arguments.insert(arguments.begin(),
+                     {"sh", "-c", "set -- " + words + "\"$@\"\n" + options.prelude + "\nexec \"$@\"", "sh", launcher});
+    program = "/bin/sh";
+  }
+  std::vector<char*> argv;
+  for (std::string& argument : arguments) argv.push_back(argument.data());
+  argv.push_back(nullptr);
+  execv(program.c_str(), argv.data());
+  _exit(126);
+}
+
+}  // namespace
+
+bool IsInstrumented() { return RUV_SANITIZED || Wrapper() != nullptr; }
+
+void WriteFile(const std::string& path, const std::string& text) {
+  fs::create_directories(fs::path(path).parent_path());
+  std::ofstream(path, std::ios::binary) << text;
+}
+
+std::string ReadFile(const std::string& path) {
+  std::ostringstream text;
+  text << std::ifstream(path, std::ios::binary).rdbuf();
+  return text.str();
+}
+
+Installation::Installation() {
+  if (std::getenv("RUV_SANDBOX") == nullptr) throw std::runtime_error("run the tests through ctest or scripts/sandbox");
+  for (const std::string& path : LauncherDirectories()) fs::remove_all(path);
+  char name[] = "/tmp/ruv-test.XXXXXX";
+  directory_ = mkdtemp(name);
+  fs::create_directory(directory_ + "/cwd");
+  fs::copy_file(LAUNCHER_EXE, directory_ + "/launcher");
+  for (const char* program : {"ruv", "tavtool", "guihelper.sh"}) Install(program);
+  WriteFile(kSystemInformationFile, "ZEM_SYSTEM_OS=203\nZEM_SYSTEM_MT=1234\nZEM_SYSTEM_ARCH=64\n");
+  WriteFile(SupportListFile(), "<MT>1234</MT>\n");
+}
+
+Installation::~Installation() {
+  std::error_code ignored;
+  fs::remove_all(directory_, ignored);
+}
+
+void Installation::Install(const std::string& name, const std::string& then) const {
+  const std::string path = directory_ + "/" + name;
+  WriteFile(path, RecordingProgram(directory_ + "/calls." + name, then));
+  fs::permissions(path, fs::perms::all);
+}
+
+void Installation::InstallTool(const std::map<std::string, int>& exit_code_of_verb, const std::string& output) const {
+  std::string then = output.empty() ? "" : "printf '%s' '" + output + "'\n";
+  then += "case $1 in\n";
+  for (const auto& [verb, exit_code] : exit_code_of_verb) {
+    then += verb + ") exit " + std::to_string(exit_code) + " ;;\n";
+  }
+  Install("tavtool", then + "esac");
+}
+
+void Installation::InstallCopyScript(const std::string& then) const {
+  WriteFile(std::string(kExpansionDirectory) + "/ruv/data/copy.sh",
+            RecordingProgram(directory_ + "/calls.copy.sh", then));
+}
+
+void Installation::CreateRepository() const { fs::create_directory(kRepository); }
+
+void Installation::MakeUnsupported() const { WriteFile(SupportListFile(), "<MT>9999</MT>\n"); }
+
+RunResult Installation::Run(const Strings& arguments, const RunOptions& options) const {
+  const std::string output = directory_ + "/stdout";
+  std::string input = directory_ + "/stdin";
+  WriteFile(output, "");
+  WriteFile(input, options.input);
+  const int terminal = options.terminal ? OpenTerminal() : -1;
+  if (options.terminal) input = ptsname(terminal);
+  const pid_t child = fork();
+  if (child == 0) ExecuteLauncher(directory_ + "/launcher", arguments, options, input, output, directory_ + "/cwd");
+  if (options.terminal) TypeAfterTheQuestion(terminal, options.input, output);
+  int status = 0;
+  waitpid(child, &status, 0);
+  if (options.terminal) close(terminal);
+  return {WIFEXITED(status) ? WEXITSTATUS(status) : 1000 + WTERMSIG(status), WithPlainDirectory(ReadFile(output))};
+}
+
+Strings Installation::CallsOf(const std::string& name) const {
+  std::ifstream file(directory_ + "/calls." + name);
+  Strings calls;
+  for (std::string line; std::getline(file, line);) calls.push_back(WithPlainDirectory(line));
+  return calls;
+}
+
+Strings Installation::ToolVerbs() const {
+  Strings verbs;
+  for (const std::string& call : CallsOf("tavtool")) verbs.push_back(call.substr(1, call.find(']') - 1));
+  return verbs;
+}
+
+std::string Installation::Trace() const { return WithPlainDirectory(ReadFile(kTraceFile)); }
+
+Strings Installation::TraceLines(const std::string& prefix) const {
+  const std::string wanted = "[TAVRUV]: " + prefix;
+  std::istringstream file(Trace());
+  Strings lines;
+  for (std::string line; std::getline(file, line);) {
+    if (line.compare(0, wanted.size(), wanted) == 0) lines.push_back(line.substr(wanted.size()));
+  }
+  return lines;
+}
+
+std::string Installation::WithPlainDirectory(std::string text) const {
+  for (std::size_t at = 0; (at = text.find(directory_, at)) != std::string::npos;) {
+    text.replace(at, directory_.size(), "@");
+  }
+  return text;
+}

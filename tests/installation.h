@@ -1,0 +1,91 @@
+// The launcher, installed in a fresh directory with stand-ins for the programs that it runs. Each run is a real
+// process; what it did is read back as the user and the other programs saw it.
+#ifndef RUV_TESTS_INSTALLATION_H
+#define RUV_TESTS_INSTALLATION_H
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+using Strings = std::vector<std::string>;
+
+inline constexpr const char* kTraceFile = "/var/log/ZEM_Support/ruvtav.log";
+inline constexpr const char* kTraceDirectory = "/var/log/ZEM_Support";
+inline constexpr const char* kSystemInformationFile = "/var/log/TAV_Support/guihelp.dat";
+inline constexpr const char* kRepository = "/var/ZEM_Support";
+inline constexpr const char* kExpansionDirectory = "/tmp/tav";
+
+struct RunOptions {
+  std::string input;                                              // standard input, to its end
+  std::map<std::string, std::optional<std::string>> environment;  // no value: the variable is removed
+  std::optional<std::string> argv0;                               // the name to start under, instead of the full path
+  std::string prelude;                                            // shell text run just before the launcher
+  bool terminal = false;  // standard input is a non-blocking terminal; the input is typed after the question
+};
+inline RunOptions Input(const std::string& text) { return {text, {}, {}, "", false}; }
+inline RunOptions Environment(const std::string& name, const std::optional<std::string>& value) {
+  return {"", {{name, value}}, {}, "", false};
+}
+inline RunOptions StartedAs(const std::string& argv0) { return {"", {}, argv0, "", false}; }
+inline RunOptions Prelude(const std::string& shell_text) { return {"", {}, {}, shell_text, false}; }
+inline RunOptions Typed(const std::string& text) { return {text, {}, {}, "", true}; }
+
+struct RunResult {
+  int status = -1;  // exit status; 1000 + N if signal N ended the launcher
+  std::string out;  // standard output and standard error, in the order written
+};
+
+class Installation {
+ public:
+  // Installs the launcher on a supported 64-bit rhel5 machine of type 1234, without a repository. Removes what an
+  // earlier installation left in the launcher's fixed directories. Throws outside a sandbox.
+  Installation();
+  ~Installation();
+  Installation(const Installation&) = delete;
+  Installation& operator=(const Installation&) = delete;
+
+  // The application's directory, without a trailing slash.
+  const std::string& Directory() const { return directory_; }
+  std::string SupportListFile() const { return directory_ + "/data/supportlist.xml"; }
+
+  // Installs a program that records its arguments and then runs the shell text.
+  void Install(const std::string& name, const std::string& then = "exit 0") const;
+  // Installs a tavtool that prints the output and ends with these exit codes for these verbs, with 0 for all others.
+  void InstallTool(const std::map<std::string, int>& exit_code_of_verb, const std::string& output = "") const;
+  // Puts a copy script into the expansion directory, where expanding a package would put it.
+  void InstallCopyScript(const std::string& then = "exit 0") const;
+  void CreateRepository() const;
+  // Leaves the machine's type out of the support list.
+  void MakeUnsupported() const;
+
+  // Runs the launcher in the empty directory "cwd" of the application's directory, in a process group of its own, and
+  // waits for it. After 20 seconds SIGALRM ends it.
+  RunResult Run(const Strings& arguments = {}, const RunOptions& options = {}) const;
+
+  // The calls that a stand-in has received: one element per call, each argument in brackets.
+  Strings CallsOf(const std::string& name) const;
+  // The first argument of each call of tavtool.
+  Strings ToolVerbs() const;
+  // The trace file's text. Here and in every text read back, "@" is the application's directory.
+  std::string Trace() const;
+  // The rest of each trace line that begins with "[TAVRUV]: " and the prefix.
+  Strings TraceLines(const std::string& prefix) const;
+
+  std::string WithPlainDirectory(std::string text) const;
+
+ private:
+  std::string directory_;
+};
+
+// True if a tool such as valgrind or AddressSanitizer watches the launcher: it changes the environment, needs /proc and
+// far more memory than the launcher.
+bool IsInstrumented();
+
+void WriteFile(const std::string& path, const std::string& text);
+std::string ReadFile(const std::string& path);  // empty if there is no such file
+
+#endif  // RUV_TESTS_INSTALLATION_H
