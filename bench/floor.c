@@ -1,5 +1,5 @@
-// The floor: what a launch-mode run cannot do without. Sets the two search paths as the launcher does, runs each of its
-// arguments through the shell in turn, and does nothing else. Usage: floor COMMAND...
+// The floor: the least a launch-mode run must do. Sets the two search paths as the launcher does and runs each of its
+// arguments through the shell. Usage: floor COMMAND...
 #include <stdio.h>
 #include <stdlib.h>
 

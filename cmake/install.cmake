@@ -28,7 +28,6 @@ endif()
 
 # In /usr of a system that has the package.
 install(FILES README.md DESTINATION ${documents} COMPONENT documents)
-install(FILES bench/results.md bench/results.svg DESTINATION ${documents}/bench COMPONENT documents)
 install(FILES docs/security.md DESTINATION ${documents}/docs COMPONENT documents)
 install(FILES completions/launcher.bash RENAME launcher DESTINATION share/bash-completion/completions
         COMPONENT documents)
