@@ -1,4 +1,4 @@
-// The launcher's own options on the command line that it shares with the application.
+// Takes the launcher's own options out of the command line that it shares with the application.
 #include <algorithm>
 #include <cctype>
 #include <cstdlib>
@@ -11,10 +11,10 @@
 namespace NZEMRUVTAV {
 
 struct TAVMaster::LongOption {
-  const char* name;               // lower case; what is typed is folded before it is compared
-  bool TAVMaster::*flag;          // set to true; none for "--show_stderr", which counts for the parse only
-  std::string TAVMaster::*value;  // takes the next argument, as typed; none for an option without a value
-  bool forwarded;                 // also passed on, in its folded form
+  const char* name;               // in lower case; the argument is folded before it is compared
+  bool TAVMaster::*flag;          // set to true; null only for "--show_stderr", which is not stored in the session
+  std::string TAVMaster::*value;  // set to the next argument, as typed; null for an option without a value
+  bool forwarded;                 // also passed on, in lower case
 };
 
 const TAVMaster::LongOption* TAVMaster::FindLongOption(const std::string& folded_name) {
@@ -50,7 +50,7 @@ std::string FoldedToLowerCase(std::string text) {
   return text;
 }
 
-// Input files are named after the machine they were collected on: the type is the start of the file's name.
+// Input files are named after the machine they were collected on: the file's name starts with the machine type.
 std::string MachineTypeOfInputFile(const std::string& path) {
   const std::size_t last_separator = path.rfind(kFileSeparator);
   const std::size_t name = last_separator == std::string::npos ? 0 : last_separator + 1;
@@ -62,33 +62,39 @@ std::string MachineTypeOfInputFile(const std::string& path) {
 void TAVMaster::ParseParameters(int argc, char** argv) {
   const char* rejection = nullptr;
   {
-    const TraceScope trace(*this, "ParseParameters");
-    bool show_stderr = false;
-    for (int i = 1; i < argc; ++i) {
-      const std::string argument = argv[i];
-      const char* next = i + 1 < argc ? argv[i + 1] : nullptr;
-      if (IsHelpRequest(argument)) {
-        PrintUsage();
-        std::exit(EXIT_SUCCESS);
-      }
-      if (!IsLongOption(argument)) {
-        TakeOrdinaryArgument(argument, next);
-      } else if (TakeLongOption(argument, next, show_stderr)) {
-        ++i;
-      }
-    }
-    if (!show_stderr) passThroughParams.emplace_back(kDiscardStandardError);
-
-    if (checkUpdate && doUpdate) {
-      rejection = "ERROR: You can not specify --chkupd and --update together";
-    } else if (updateTargetGiven && !checkUpdate && !doUpdate) {
-      rejection =
-          "Error: You should specify [--update_m]/[--update_os]/[--update_arch] with [--chkupd] or "
-          "[--update]";
-    }
+    // A block of its own, because exit() runs no destructors and the exit line comes before the exit.
+    const TraceScope trace(*this, __func__);
+    TakeArguments(argc, argv);
+    rejection = RejectedCombination();
     if (rejection != nullptr) PrintLine(rejection);
   }
   if (rejection != nullptr) std::exit(EXIT_FAILURE);
+}
+
+void TAVMaster::TakeArguments(int argc, char** argv) {
+  bool show_stderr = false;
+  for (int i = 1; i < argc; ++i) {
+    const std::string argument = argv[i];
+    const char* next = i + 1 < argc ? argv[i + 1] : nullptr;
+    if (IsHelpRequest(argument)) {
+      PrintUsage();
+      std::exit(EXIT_SUCCESS);
+    }
+    if (!IsLongOption(argument)) {
+      TakeOrdinaryArgument(argument, next);
+    } else if (TakeLongOption(argument, next, show_stderr)) {
+      ++i;
+    }
+  }
+  if (!show_stderr) passThroughParams.emplace_back(kDiscardStandardError);
+}
+
+const char* TAVMaster::RejectedCombination() const {
+  if (checkUpdate && doUpdate) return "ERROR: You can not specify --chkupd and --update together";
+  if (updateTargetGiven && !checkUpdate && !doUpdate) {
+    return "Error: You should specify [--update_m]/[--update_os]/[--update_arch] with [--chkupd] or [--update]";
+  }
+  return nullptr;
 }
 
 bool TAVMaster::TakeLongOption(const std::string& argument, const char* next, bool& show_stderr) {
@@ -117,7 +123,7 @@ void TAVMaster::TakeOrdinaryArgument(std::string argument, const char* next) {
   if (argument == "-i" || argument == "-r") inputFileGiven = true;
   if (argument == "-i" && next != nullptr) machineType = MachineTypeOfInputFile(next);
   if (argument == "-b") batchMode = true;
-  // A value, such as a file name or an address, is quoted for the shell; what has a dash anywhere is left as typed.
+  // A value, such as a file name or an address, is quoted for the shell. An argument with a dash is left as typed.
   if (argument.find('-') == std::string::npos) FormatPathString(argument);
   passThroughParams.push_back(argument);
 }

@@ -1,9 +1,8 @@
-// The last step: the application's command line, the question on unsupported machines, and the application itself.
+// The last step: builds the application's command line and runs it, on an unsupported machine after a question.
 #include <algorithm>
-#include <cctype>
-#include <cstdio>
 #include <iterator>
 
+#include "launch/yes_no_question.h"
 #include "launcher/command_fragments.h"
 #include "launcher/console.h"
 #include "launcher/shell.h"
@@ -13,57 +12,19 @@
 namespace NZEMRUVTAV {
 namespace {
 
-constexpr const char* kQuestion = "Do you want to proceed anyway (function may be limited)? (Y/N)";
-
-// The application's options whose value is always quoted, whatever it is.
+// True for the application's options whose value is always quoted.
 bool TakesQuotedValue(const std::string& argument) {
   constexpr const char* kSpecialParameters[] = {"-i", "-r", "-d", "-html"};
   return std::any_of(std::begin(kSpecialParameters), std::end(kSpecialParameters),
                      [&](const char* special) { return argument == special; });
 }
 
-// Reads one line from standard input and returns 'y' or 'n' when that letter, in either case, is all of it, and 0 for
-// every other line. The end of the input and a read error count as "n". Reads byte by byte, so that what follows the
-// line is left for the application.
-int ReadAnswer() {
-  std::setvbuf(stdin, nullptr, _IONBF, 0);
-  std::clearerr(stdin);
-  int answer = 0;
-  std::size_t length = 0;
-  int character = 0;
-  while ((character = std::getchar()) != EOF && character != '\n') {
-    if (length++ == 0) answer = std::tolower(character);
-  }
-  if (character == EOF && (length == 0 || std::ferror(stdin) != 0)) return 'n';
-  return length == 1 && (answer == 'y' || answer == 'n') ? answer : 0;
-}
-
-bool UserAgrees() {
-  for (;;) {
-    Print(kQuestion);
-    FlushConsole();
-    const int answer = ReadAnswer();
-    if (answer != 0) return answer == 'y';
-  }
-}
-
 }  // namespace
 
-int TAVMaster::InvokeRUV(std::string application_path, std::vector<std::string> arguments, bool warn_unsupported) {
-  const TraceScope trace(*this, "InvokeRUV");
-  std::string command = application_path;
-  for (auto argument = arguments.begin(); argument != arguments.end(); ++argument) {
-    const bool takes_value = TakesQuotedValue(*argument);
-    if (takes_value) DebugLog("[Debug:] Processing special parameters [%s]", argument->c_str());
-    command += kSpaceSeparator + *argument;
-    if (!takes_value) continue;
-    if (std::next(argument) == arguments.end()) {
-      DebugLog("[Error:]InvokeRUV: required parameters are missing for option = %s", argument->c_str());
-      break;
-    }
-    ++argument;
-    command += kSpaceSeparator + Quoted(*argument);
-  }
+int TAVMaster::InvokeRUV(std::string application_path, std::vector<std::string> arguments,
+                         bool warn_unsupported) const {
+  const TraceScope trace(*this, __func__);
+  std::string command = LaunchCommand(application_path, arguments);
   FormatCommandString(command);
   DebugLog("[Status:]InvokeRUV: command = %s", command.c_str());
 
@@ -77,6 +38,23 @@ int TAVMaster::InvokeRUV(std::string application_path, std::vector<std::string> 
   }
   RunInShell(command);
   return 1;
+}
+
+std::string TAVMaster::LaunchCommand(const std::string& application_path,
+                                     const std::vector<std::string>& arguments) const {
+  std::string command = application_path;
+  for (auto argument = arguments.begin(); argument != arguments.end(); ++argument) {
+    command += kSpaceSeparator + *argument;
+    if (!TakesQuotedValue(*argument)) continue;
+    DebugLog("[Debug:] Processing special parameters [%s]", argument->c_str());
+    if (std::next(argument) == arguments.end()) {
+      DebugLog("[Error:]InvokeRUV: required parameters are missing for option = %s", argument->c_str());
+      break;
+    }
+    ++argument;
+    command += kSpaceSeparator + Quoted(*argument);
+  }
+  return command;
 }
 
 }  // namespace NZEMRUVTAV

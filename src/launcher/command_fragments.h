@@ -17,7 +17,7 @@ inline const std::string kFileSeparator = "/";
 inline const std::string kSpaceSeparator = " ";
 
 inline const std::string OutputToNULL = "1>/dev/null 2>&1";
-inline const std::string kToolOutputFile = "tav.log";  // relative: in the directory of the caller's shell
+inline const std::string kToolOutputFile = "tav.log";  // relative to the current directory
 inline const std::string OutputToLog = "1>" + kToolOutputFile + " 2>&1";
 
 inline const std::string MKDIR = "mkdir -p";

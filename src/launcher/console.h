@@ -1,4 +1,4 @@
-// Messages for the user: standard output only. Write errors there are not reported to anyone.
+// Messages for the user: standard output only. Write errors are ignored.
 #ifndef RUV_LAUNCHER_CONSOLE_H
 #define RUV_LAUNCHER_CONSOLE_H
 
@@ -6,7 +6,7 @@
 
 namespace NZEMRUVTAV {
 
-// Prints the text as it is, without a line feed or a flush: the next message continues the line.
+// Prints the text without a line feed or a flush: the next message continues the line.
 inline void Print(const char* text) { std::fputs(text, stdout); }
 
 inline void FlushConsole() { std::fflush(stdout); }

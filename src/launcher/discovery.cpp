@@ -1,4 +1,4 @@
-// Start-up: where the launcher lives and what machine it runs on.
+// Start-up: finds the launcher's directory and discovers the machine.
 #include <dlfcn.h>
 #include <unistd.h>
 
@@ -6,6 +6,7 @@
 #include <climits>
 #include <cstdlib>
 #include <exception>
+#include <optional>
 #include <string_view>
 
 #include "launcher/command_fragments.h"
@@ -19,22 +20,24 @@ namespace NZEMRUVTAV {
 namespace {
 
 constexpr const char* kSystemInformationFile = "/var/log/TAV_Support/guihelp.dat";
+constexpr const char* kRepositoryDirectory = "/var/ZEM_Support";
+constexpr const char* kExpansionDirectory = "/tmp/tav";
+
 constexpr std::string_view kOperatingSystemKey = "ZEM_SYSTEM_OS=";
 constexpr std::string_view kMachineTypeKey = "ZEM_SYSTEM_MT=";
 constexpr std::string_view kArchitectureKey = "ZEM_SYSTEM_ARCH=";
 
-// What OSMapping gets for a value that is no int: a code that no system has, so that the default stays.
+// Passed to OSMapping if the value is not an int. No system has this code, so nothing changes.
 constexpr int kNoOperatingSystemCode = -1;
 
-// An address in this program. The library is linked statically, so the object that holds it is the one with main.
+// An address in this program: this file is linked into it statically.
 constexpr char kAddressInProgram = 0;
 
-// Finds the key anywhere in the line; sets value to everything after its first occurrence.
-bool FindValue(std::string_view line, std::string_view key, std::string& value) {
+// Returns everything after the first occurrence of the key in the line.
+std::optional<std::string> ValueOf(std::string_view key, std::string_view line) {
   const std::size_t position = line.find(key);
-  if (position == std::string_view::npos) return false;
-  value = line.substr(position + key.size());
-  return true;
+  if (position == std::string_view::npos) return std::nullopt;
+  return std::string(line.substr(position + key.size()));
 }
 
 // Reads an integer at the beginning of the text: leading white space skipped, an optional sign, decimal digits.
@@ -46,7 +49,7 @@ int OperatingSystemCode(const std::string& text) {
   return is_int ? static_cast<int>(code) : kNoOperatingSystemCode;
 }
 
-// The path of the running executable, of any length; empty when /proc does not tell.
+// Returns the path of the running executable, or "" if /proc is not available.
 std::string RunningExecutable() {
   std::string path(256, '\0');
   for (;;) {
@@ -63,7 +66,7 @@ std::string RunningExecutable() {
 }  // namespace
 
 TAVMaster::TAVMaster() {
-  const TraceScope trace(*this, "TAVMaster", "[Debug:] Enter: TAVMaster::TAVMaster()");
+  const TraceScope trace(*this, __func__, "[Debug:] Enter: TAVMaster::TAVMaster()");
   operatingSystemType = "windows";
   machineType = "0000";
   operatingSystemArch = "64";
@@ -71,15 +74,15 @@ TAVMaster::TAVMaster() {
   const char* portable_directory = std::getenv("ZEM_PORTABLE_EXEC_DIR");
   portablePath = portable_directory == nullptr ? "" : portable_directory;
 
-  // The script's directory is bare, unlike the paths of the commands to come.
+  // The script's path is bare, unlike the paths in all later commands.
   const std::string command = workingPath + kFileSeparator + "guihelper.sh" + kSpaceSeparator + OutputToNULL;
   DebugLog("[Status:]TAVMaster: command = %s", command.c_str());
   RunInShell(command);
   ReadSystemInformation();
 
   TAVMasterGetSupportList();
-  uncompressedPath = "/tmp/tav";
-  repositoryPath = "/var/ZEM_Support";
+  uncompressedPath = kExpansionDirectory;
+  repositoryPath = kRepositoryDirectory;
 
   DebugLog("[Status:]OS = %s", operatingSystemType.c_str());
   DebugLog("[Status:]MT = %s", machineType.c_str());
@@ -89,8 +92,8 @@ TAVMaster::TAVMaster() {
   DebugLog("[Status:]TAV Uncompressed Path = %s", uncompressedPath.c_str());
 }
 
-// Takes the identity from the file that guihelper.sh wrote, or that an earlier run left. Keys that never appear leave
-// the defaults. A line yields the first key that it holds, in the order below; of several lines the last one wins.
+// Reads the identity from the file that guihelper.sh wrote, or that an earlier run left. Keys that never appear leave
+// the defaults. Of the keys on one line the first below counts; of the lines with the same key, the last.
 void TAVMaster::ReadSystemInformation() {
   LineReader file(kSystemInformationFile);
   if (!file.IsOpen()) {
@@ -99,26 +102,25 @@ void TAVMaster::ReadSystemInformation() {
     return;
   }
   std::string_view line;
-  std::string value;
   while (file.Next(line)) {
-    if (FindValue(line, kOperatingSystemKey, value)) {
-      OSMapping(OperatingSystemCode(value));
-    } else if (FindValue(line, kMachineTypeKey, value)) {
-      machineType = value;
-    } else if (FindValue(line, kArchitectureKey, value)) {
-      operatingSystemArch = value;
+    if (const auto code = ValueOf(kOperatingSystemKey, line)) {
+      OSMapping(OperatingSystemCode(*code));
+    } else if (const auto type = ValueOf(kMachineTypeKey, line)) {
+      machineType = *type;
+    } else if (const auto architecture = ValueOf(kArchitectureKey, line)) {
+      operatingSystemArch = *architecture;
     }
   }
 }
 
 std::string TAVMaster::GetTAVBinaryPath() const {
-  const TraceScope trace(*this, "GetTAVBinaryPath");
+  const TraceScope trace(*this, __func__);
   Dl_info program = {};
   if (dladdr(&kAddressInProgram, &program) == 0 || program.dli_fname == nullptr || *program.dli_fname == '\0') {
     throw std::exception();
   }
   std::string path = program.dli_fname;
-  // The loader reports the main program by the name it was started with: without a slash, that is no path at all.
+  // The loader reports the main program by the name it was started with. Without a slash that is not a path.
   if (path.find(kFileSeparator) == std::string::npos) path = RunningExecutable();
   const std::size_t last_separator = path.rfind(kFileSeparator);
   if (last_separator == std::string::npos) throw std::exception();

@@ -7,7 +7,7 @@
 
 namespace NZEMRUVTAV {
 
-// Reads a text file line by line; lines end at a line feed, the last one needs none.
+// Reads a text file line by line. Lines end at a line feed; the last one needs none.
 class LineReader {
  public:
   explicit LineReader(const std::string& path);
@@ -15,11 +15,11 @@ class LineReader {
   LineReader(const LineReader&) = delete;
   LineReader& operator=(const LineReader&) = delete;
 
-  // False when the file could not be opened. A directory opens; reading it then fails at once.
+  // False if the file could not be opened. A directory can be opened, but reading it fails at once.
   bool IsOpen() const { return file_ != nullptr; }
 
-  // Sets the line, without its line feed, valid until the next call. Returns false at the end of the file and at a read
-  // error; a line that an error cut short is not a line.
+  // Sets the line, without its line feed; it is valid until the next call. Returns false at the end of the file and
+  // after a read error, also if the error came in the middle of a line.
   bool Next(std::string_view& line);
 
  private:

@@ -20,8 +20,7 @@ constexpr OperatingSystemCodes kOperatingSystems[] = {
 }  // namespace
 
 void TAVMaster::OSMapping(int code) {
-  const TraceScope trace(*this, "OSMapping",
-                         "[Debug:] Entering TAVMaster::OSMapping(), code = " + std::to_string(code));
+  const TraceScope trace(*this, __func__, "[Debug:] Entering TAVMaster::OSMapping(), code = " + std::to_string(code));
   for (const OperatingSystemCodes& system : kOperatingSystems) {
     if (system.first <= code && code <= system.last) {
       operatingSystemType = system.name;

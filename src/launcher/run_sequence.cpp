@@ -1,4 +1,4 @@
-// The driver: which step follows which, in update mode and in launch mode.
+// The driver: the order of the steps in update mode and in launch mode.
 #include "launcher/command_fragments.h"
 #include "launcher/console.h"
 #include "launcher/tav.h"
@@ -8,7 +8,7 @@
 namespace NZEMRUVTAV {
 
 int TAVMaster::TAVMasterMain(int argc, char** argv) {
-  const TraceScope trace(*this, "TAVMasterMain");
+  const TraceScope trace(*this, __func__);
   ParseParameters(argc, argv);
   if (checkUpdate || doUpdate) {
     RunUpdateMode();
@@ -30,7 +30,7 @@ void TAVMaster::RunUpdateMode() {
     PrintLine("Failed");
     return;
   }
-  // A portable installation keeps the package on its media, for later runs on any machine to import.
+  // A portable installation keeps the package on its media, where later runs on any machine import it.
   if (!isPortableRUV() && CompareTAVPackage(GetRepositoryPath(), GetWorkingPath()) == kPackageToInstall) {
     InstallRepositoryPackage();
   }
@@ -46,7 +46,7 @@ void TAVMaster::RunLaunchMode() {
       InstallRepositoryPackage();
     }
   }
-  // Decided after the installation, which makes this machine's type a supported one.
+  // Only now: the installation adds this machine's type to the support list.
   const bool warn_unsupported = NeedsSupportWarning();
   std::string application_path = GetWorkingPath() + kFileSeparator + "ruv";
   FormatPathString(application_path);
@@ -57,8 +57,8 @@ void TAVMaster::InstallRepositoryPackage() {
   if (DecompressTAV(GetRepositoryPath(), GetUncompressedPath()) == kSuccess) UpdateSupportList();
 }
 
-// The machine type is unknown to the application, and neither an input file, nor a remote target, nor the platform
-// makes that beside the point.
+// True if the machine type is not supported and it matters: no input file, no remote target, not a pre-installation
+// environment.
 bool TAVMaster::NeedsSupportWarning() const {
   if (isSystemInSupportList() || inputFileGiven || isIgnoreTAVPackage()) return false;
   return !IsWinPE3_X();

@@ -15,7 +15,8 @@ constexpr SearchPath kLibraryPath = {"LD_LIBRARY_PATH",
                                      "./:./qlogic/qcccli/:./qlogic/:./fibre/:./megalsi:./mellanox:./nvidia"};
 constexpr SearchPath kExecutablePath = {"PATH", "./mellanox"};
 
-// A variable that is present but empty counts as present: its new value begins with a colon.
+// Returns the variable's new value. A variable that is present but empty counts as present: the value begins with a
+// colon.
 std::string Extended(const SearchPath& path) {
   const char* old_value = std::getenv(path.variable);
   return old_value == nullptr ? path.directories : std::string(old_value) + ":" + path.directories;

@@ -3,8 +3,8 @@
 
 namespace NZEMRUVTAV {
 
-// Appends the vendor directories to LD_LIBRARY_PATH and PATH of this process, and so of every command that it runs. The
-// directories are relative: they count from the current directory of whoever uses them.
+// Appends the vendor directories to LD_LIBRARY_PATH and PATH of this process, and so of every command that it runs.
+// They are relative to the current directory of the process that uses them.
 void ExtendSearchPaths();
 
 }  // namespace NZEMRUVTAV

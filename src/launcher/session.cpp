@@ -1,4 +1,4 @@
-// The session's accessors, flag tests and shared helpers, and its end. Its beginning is discovery.cpp.
+// TAVMaster's destructor, accessors, flag tests and shared helpers. Its constructor is in discovery.cpp.
 #include <sys/stat.h>
 
 #include "launcher/command_fragments.h"
@@ -8,7 +8,7 @@
 
 namespace NZEMRUVTAV {
 
-TAVMaster::~TAVMaster() { const TraceScope trace(*this, "~TAVMaster"); }
+TAVMaster::~TAVMaster() { const TraceScope trace(*this, __func__); }
 
 std::string TAVMaster::GetOperatingSystemType() const { return operatingSystemType; }
 std::string TAVMaster::GetMachineType() const { return machineType; }
@@ -47,10 +47,9 @@ std::string TAVMaster::Quoted(std::string path) const {
 
 std::string TAVMaster::PortableUpdateFolder() const { return portablePath + kFileSeparator + "update"; }
 
-void TAVMaster::EnsureDirectory(const std::string& path, const std::string& redirection, const char* traced_by) const {
+void TAVMaster::EnsureDirectory(const std::string& path, const char* traced_by) const {
   if (DirExists(path)) return;
-  std::string command = MKDIR + kSpaceSeparator + path;
-  if (!redirection.empty()) command += kSpaceSeparator + redirection;
+  const std::string command = MKDIR + kSpaceSeparator + path + kSpaceSeparator + OutputToNULL;
   if (traced_by != nullptr) DebugLog("[Status:]%s: command = %s", traced_by, command.c_str());
   RunInShell(command);
 }

@@ -1,4 +1,4 @@
-// The one way in which the launcher runs other programs.
+// The only way in which the launcher runs other programs.
 #ifndef RUV_LAUNCHER_SHELL_H
 #define RUV_LAUNCHER_SHELL_H
 
@@ -7,7 +7,9 @@
 
 namespace NZEMRUVTAV {
 
-// Runs the command through the shell and waits for it. Returns the wait status, or -1 when no shell could be run.
+// Runs the command through the shell and waits for it. Returns the wait status. If no shell can be started, that is the
+// status of exit code 127, as for a command that the shell does not find; -1 if waiting fails or, with C libraries
+// before glibc 2.29, no process can be created.
 inline int RunInShell(const std::string& command) { return std::system(command.c_str()); }
 
 }  // namespace NZEMRUVTAV

@@ -3,10 +3,11 @@
 
 namespace NZEMRUVTAV {
 
-// Makes the run independent of how its parent left the signals, and of where its output goes:
-// - SIGCHLD gets its default back: ignored, as some daemons leave it, it would hide every exit status from system().
-// - SIGPIPE and SIGXFSZ no longer end the launcher between two steps when the console is closed or a file-size limit
-//   is met. They get an empty handler instead of being ignored, so that the programs it runs start with the default.
+// Resets the signal dispositions that a run must not inherit:
+// - SIGCHLD gets its default back. If ignored, as some daemons leave it, it hides every exit status from system().
+// - SIGPIPE and SIGXFSZ no longer end the launcher between two steps if the console is closed or a file-size limit is
+//   reached. They get an empty handler instead of being ignored, so that the programs it runs start with the default.
+// Ctrl-C (SIGINT) is left to system(), and HandleTAVToolReturnValue in packages/exit_codes.cpp ends the run.
 void PrepareSignals();
 
 }  // namespace NZEMRUVTAV

@@ -1,5 +1,4 @@
-// Where the trace file is and what a line of it looks like, for the launcher that writes it and ruv-trace that reads
-// it.
+// The path and the line format of the trace file, shared by the launcher and ruv-trace.
 #ifndef RUV_LOG_TRACE_FORMAT_H
 #define RUV_LOG_TRACE_FORMAT_H
 

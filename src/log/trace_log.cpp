@@ -1,19 +1,20 @@
-// The trace file: opened, appended to and closed for every line, so that a line is in the file when DebugLog returns
-// and nothing holds the file open while other programs run.
+// The trace file. It is opened and closed for every line, so that the line is in the file when DebugLog returns and the
+// file is not open while other programs run.
 #include <cstdarg>
 #include <cstdio>
 #include <new>
 
 #include "launcher/command_fragments.h"
 #include "launcher/console.h"
+#include "launcher/shell.h"
 #include "launcher/tav.h"
 #include "log/trace_format.h"
 
 namespace NZEMRUVTAV {
 namespace {
 
-// The longest line fits into the buffer, and so is written at once, by fclose. A buffer of stdio's own would cost an
-// allocation and one more system call for every line.
+// Appends the line; returns false if the file cannot be opened. The longest line fits into the buffer, so fclose writes
+// it at once. A buffer of stdio's own would cost an allocation and another system call for every line.
 bool AppendLine(const std::string& path, const std::string& line) {
   char buffer[2 * kMessageBufferSize];
   std::FILE* file = std::fopen(path.c_str(), "a+");
@@ -27,7 +28,7 @@ bool AppendLine(const std::string& path, const std::string& line) {
 }  // namespace
 
 std::string TAVMaster::GetLogfileName() const {
-  EnsureDirectory(kLogDirectory, "");
+  if (!DirExists(kLogDirectory)) RunInShell(MKDIR + kSpaceSeparator + kLogDirectory);
   return kLogDirectory + kFileSeparator + kLogFile;
 }
 

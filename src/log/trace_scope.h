@@ -8,15 +8,15 @@
 
 namespace NZEMRUVTAV {
 
-// Writes a member's entry line when it is created and the exit line when the member returns, by whichever way. A member
-// that an exception leaves gets no exit line.
+// Traces a member's entry on construction and its exit on destruction, unless an exception is leaving the member.
 class TraceScope {
  public:
-  // member: the name without the parentheses; it must outlive the scope.
-  TraceScope(const TAVMaster& session, const char* member)
-      : TraceScope(session, member, std::string("[Debug:] Entering TAVMaster::") + member + "()") {}
+  // member: the name without the parentheses, that is, __func__; it must outlive the scope.
+  TraceScope(const TAVMaster& session, const char* member) : session_(session), member_(member) {
+    session_.DebugLog("[Debug:] Entering TAVMaster::%s()", member_);
+  }
 
-  // For the members whose entry line is not the usual one.
+  // For members with an entry line of their own.
   TraceScope(const TAVMaster& session, const char* member, const std::string& entry_line)
       : session_(session), member_(member) {
     session_.DebugLog("%s", entry_line.c_str());

@@ -1,10 +1,10 @@
-// What the package tool's exit codes mean: the tables that the launcher goes by and that ruv-trace explains a run with.
+// The meaning of the package tool's exit codes: the tables used by the launcher and by ruv-trace.
 #ifndef RUV_PACKAGES_EXIT_CODE_TABLES_H
 #define RUV_PACKAGES_EXIT_CODE_TABLES_H
 
 namespace NZEMRUVTAV {
 
-// What a package step makes of an exit code, and returns.
+// Results of a package step.
 inline constexpr int kSuccess = 0;
 inline constexpr int kFailure = 1;  // every code that is not in kToolResults
 inline constexpr int kPackageToInstall = 2;

@@ -1,4 +1,4 @@
-// What becomes of the package tool's exit codes, for the calling step and for the user.
+// Maps the package tool's exit codes to step results and prints the messages of known errors.
 #include <cstdlib>
 
 #include "launcher/console.h"
@@ -18,7 +18,7 @@ int TAVMaster::HandleTAVToolReturnValue(int status) const {
     PrintLine("RUV application is determined by the user!");
     std::exit(EXIT_FAILURE);
   }
-  // Not WEXITSTATUS: a system() failure, -1, must stay -1.
+  // Not WEXITSTATUS: -1, a failure of system() itself, must stay -1.
   const int exit_code = status >> 8;
   DebugLog("[Status:]Return Code from tavtool = %d", exit_code);
   for (const ToolResult& known : kToolResults) {
