@@ -1,7 +1,9 @@
+#include <cxxabi.h>
+
 #include <cstdlib>
 #include <exception>
 #include <memory>
-#include <new>
+#include <typeinfo>
 
 #include "launcher/console.h"
 #include "launcher/search_paths.h"
@@ -10,25 +12,35 @@
 
 namespace {
 
-int RunLauncher(int argc, char** argv) {
-  NZEMRUVTAV::ExtendSearchPaths();
-  const auto session = std::make_unique<NZEMRUVTAV::TAVMaster>();
-  return session->TAVMasterMain(argc, argv);
+// Ends the process with one line and status 1, instead of an abort and a core file. The launcher itself throws only a
+// plain std::exception. Anything else is a lack of memory; there is no type if not even the exception could be created.
+[[noreturn]] void ReportUncaughtException() {
+  const std::type_info* type = abi::__cxa_current_exception_type();
+  const bool directory_is_unknown = type != nullptr && *type == typeid(std::exception);
+  NZEMRUVTAV::PrintLine(directory_is_unknown
+                            ? "ERROR: Unable to find the directory of the RUV launcher, RUV is not started."
+                            : "ERROR: Not enough memory, RUV launcher ends.");
+  std::_Exit(EXIT_FAILURE);
+}
+
+// Runs before the constructors of the static strings, for which memory may run out as well.
+[[gnu::constructor(101)]] void InstallTerminateHandler() { std::set_terminate(ReportUncaughtException); }
+
+// Runs the launcher in a session of its own. An exception passes through a handler here because otherwise the process
+// would end without unwinding the stack, that is, without the session's destructor.
+int RunSession(int argc, char** argv) {
+  try {
+    const auto session = std::make_unique<NZEMRUVTAV::TAVMaster>();
+    return session->TAVMasterMain(argc, argv);
+  } catch (...) {
+    throw;
+  }
 }
 
 }  // namespace
 
-// An exception that leaves a run ends the process with one line on standard output and status 1, after the session is
-// released, rather than with an abort and a core file.
 int main(int argc, char** argv) {
   NZEMRUVTAV::PrepareSignals();
-  try {
-    return RunLauncher(argc, argv);
-  } catch (const std::bad_alloc&) {
-    NZEMRUVTAV::PrintLine("ERROR: Not enough memory, RUV launcher ends.");
-  } catch (const std::exception&) {
-    // The one exception that the launcher throws itself, and it carries no text.
-    NZEMRUVTAV::PrintLine("ERROR: Unable to find the directory of the RUV launcher, RUV is not started.");
-  }
-  return EXIT_FAILURE;
+  NZEMRUVTAV::ExtendSearchPaths();
+  return RunSession(argc, argv);
 }
