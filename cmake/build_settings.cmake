@@ -5,6 +5,8 @@ set(CMAKE_POSITION_INDEPENDENT_CODE ON)
 
 add_library(build_settings INTERFACE)
 target_compile_features(build_settings INTERFACE cxx_std_17)
+# On 32 bits, too, files may be larger than 2 GiB.
+target_compile_definitions(build_settings INTERFACE _FILE_OFFSET_BITS=64)
 target_compile_options(build_settings INTERFACE
   -Wall -Wextra -Wpedantic -Wconversion -Wshadow $<$<BOOL:${RUV_WERROR}>:-Werror>)
 

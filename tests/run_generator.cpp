@@ -59,7 +59,7 @@ class Generator {
   }
 
  private:
-  std::size_t Below(std::size_t limit) { return random_() % limit; }
+  std::size_t Below(std::size_t limit) { return static_cast<std::size_t>(random_() % limit); }
   bool OneIn(std::size_t count) { return Below(count) == 0; }
   const char* Pick(const Alternatives& alternatives) { return alternatives[Below(alternatives.size())]; }
 
