@@ -1,5 +1,6 @@
 // Start-up: finds the launcher's directory and discovers the machine.
 #include <dlfcn.h>
+#include <sys/auxv.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -49,18 +50,20 @@ int OperatingSystemCode(const std::string& text) {
   return is_int ? static_cast<int>(code) : kNoOperatingSystemCode;
 }
 
-// Returns the path of the running executable, or "" if /proc is not available.
+// Returns the path of the running executable as /proc gives it or, where /proc is not mounted, as execve(2) got it.
 std::string RunningExecutable() {
   std::string path(256, '\0');
   for (;;) {
     const ssize_t length = readlink("/proc/self/exe", path.data(), path.size());
-    if (length < 0) return "";
+    if (length < 0) break;
     if (static_cast<std::size_t>(length) < path.size()) {
       path.resize(static_cast<std::size_t>(length));
       return path;
     }
     path.resize(path.size() * 2);
   }
+  const auto* executed = reinterpret_cast<const char*>(getauxval(AT_EXECFN));
+  return executed == nullptr ? "" : executed;
 }
 
 }  // namespace
