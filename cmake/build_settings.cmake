@@ -1,4 +1,4 @@
-# build_settings: the language level, warnings, hardening and run-time libraries that every program here is built with.
+# build_settings: the language level, warnings, hardening and run-time libraries of every program.
 include(CheckPIESupported)
 check_pie_supported(LANGUAGES CXX)
 set(CMAKE_POSITION_INDEPENDENT_CODE ON)
@@ -21,11 +21,11 @@ else()
 endif()
 target_link_options(build_settings INTERFACE -Wl,-z,relro,-z,now)
 
-# What no program uses of the libraries linked into it is left out.
+# Leave unused library code out of the programs.
 target_compile_options(build_settings INTERFACE -ffunction-sections -fdata-sections)
 target_link_options(build_settings INTERFACE -Wl,--gc-sections)
 
-# Start-up is faster without the two shared libraries, and the programs run beside an older libstdc++.
+# Start-up is faster without the two shared libraries, and the programs run where libstdc++ is older.
 if(RUV_STATIC_RUNTIME)
   target_link_options(build_settings INTERFACE -static-libstdc++ -static-libgcc)
 endif()

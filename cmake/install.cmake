@@ -1,6 +1,5 @@
-# Where everything goes. `cmake --install build` puts all of it below the prefix, the directory of the diagnostics
-# application. In the packages (packages.cmake) only the programs stand there: what other programs look up goes where
-# they look, by component.
+# `cmake --install build` installs everything below the prefix, the directory of the diagnostics application. In the
+# packages (packages.cmake) only the programs are there; the other components go to /usr and /etc.
 if(CMAKE_INSTALL_PREFIX_INITIALIZED_TO_DEFAULT)
   set(CMAKE_INSTALL_PREFIX /opt/ruv CACHE PATH "Directory of the diagnostics application" FORCE)
 endif()
@@ -27,16 +26,18 @@ if(TARGET ruv-trace)
 endif()
 
 # In /usr of a system that has the package.
-install(FILES README.md DESTINATION ${documents} COMPONENT documents)
-install(FILES docs/security.md DESTINATION ${documents}/docs COMPONENT documents)
+install(FILES docs/administrator.md RENAME README.md DESTINATION ${documents} COMPONENT documents)
+install(FILES docs/security.md DESTINATION ${documents} COMPONENT documents)
 install(FILES completions/launcher.bash RENAME launcher DESTINATION share/bash-completion/completions
         COMPONENT documents)
 install(FILES packaging/tmpfiles.conf RENAME ruv-launcher.conf DESTINATION lib/tmpfiles.d COMPONENT documents)
+install(FILES packaging/ruv-launcher.service packaging/ruv-launcher.timer DESTINATION lib/systemd/system
+        COMPONENT documents)
 
 # In /etc.
 install(FILES packaging/logrotate.conf RENAME ruv-launcher DESTINATION etc/logrotate.d COMPONENT settings)
 
-# In /usr as well, under names and in directories of which Debian has its own.
+# In /usr as well; Debian has its own names and directories for these, see below.
 install(FILES LICENSE CHANGELOG.md DESTINATION ${documents} COMPONENT generic)
 install(FILES completions/launcher.zsh RENAME _launcher DESTINATION share/zsh/site-functions COMPONENT generic)
 

@@ -1,4 +1,4 @@
-# Read by cpack for each kind of package: which components go into it, and where.
+# Read by cpack for each package format: its components and their directories.
 list(GET CPACK_INSTALL_CMAKE_PROJECTS 0 build_tree)
 set(CPACK_INSTALL_CMAKE_PROJECTS)
 macro(put component directory)
@@ -13,6 +13,3 @@ if(CPACK_GENERATOR STREQUAL "DEB")
 else()
   put(generic /usr)
 endif()
-
-# The archive is unpacked at /.
-set(CPACK_INCLUDE_TOPLEVEL_DIRECTORY OFF)
