@@ -1,17 +1,17 @@
-// ruv-trace: what the launcher's trace tells of its runs, one line each.
-#include <fcntl.h>
+// ruv-trace: summarises the trace of the launcher.
 #include <getopt.h>
-#include <unistd.h>
 
+#include <array>
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
 
-#include "line_source.h"
+#include "input_file.h"
 #include "log/trace_format.h"
 #include "report.h"
 #include "trace_reader.h"
@@ -20,115 +20,152 @@ namespace {
 
 using namespace ruv_trace;
 
-constexpr int kUsageError = 2;
-
 constexpr const char* kHelp =
-    R"(Usage: ruv-trace [--json] [FILE]...
-Tells what the runs of the RUV launcher did, one line a run, from its trace:
-the FILEs, "-" for standard input, or %s.
+    R"(Usage: ruv-trace [OPTION]... [FILE]...
+Summarises the RUV launcher's trace, one line per run. Reads the FILEs in this
+order, "-" being standard input; the default is %s.
 
-  --json      one JSON object a run (JSON Lines)
-  -h, --help  show this text
-  --version   show the version
-
-A line shows, where the trace does:
-- the number of the run, and the line of the file where it begins;
-- the machine type, operating system and architecture, as found on the machine
-  or, where it differs, as given to tavtool;
-- what it did: launch, check or update;
-- each call of tavtool with its exit code and what that means (under some
-  shells the code is 0 also when a signal ended tavtool);
-- the package. "Copy script ran" says no more than that: what the script
-  printed is in the trace, whether it succeeded is not;
-- how the run ended. "Unfinished" is interrupted, cut short or still going on;
-- ruv and its command:
-  started              the launcher ran the command, with whatever success
-  started or declined  the user may have been asked whether to go on, and what
-                       was answered is not in the trace
-  unknown              the run is unfinished at that point, or lines are missing
-  not started
-"Mixed with another run" ran at the same time as another, and some of its lines
-may be the other's. A command that the trace may have cut ends with "..." (in
-JSON, "command_cut" is true).
-
-The trace may hold any bytes. Control characters and invalid UTF-8 are shown as
-\xHH; in JSON, U+FFFD stands for invalid UTF-8. Each FILE is read by itself; for
-runs that go on in the next file: cat OLD NEW | ruv-trace -. A compressed FILE
-is refused: zcat FILE | ruv-trace -
-
-Exit status: 0; 1 when a file cannot be read or the output cannot be written;
-2 for a wrong option.
+  --problems        show only the runs that are not ok
+  --long            also show tool calls, commands and lines of the file
+  --json            print one JSON object per run
+  --check           judge the last run: one line, and status 0 if it is ok,
+                    1 if it is a problem, 2 if unknown, 3 if there is none
+  --show-passwords  show the passwords in commands
+  -h, --help        show this text
+  --version         show the version
+See ruv-trace(8) for the meaning of each word of the output.
 )";
 
-std::string DefaultFile() { return std::string(NZEMRUVTAV::kLogDirectory) + "/" + NZEMRUVTAV::kLogFile; }
+enum ExitStatus : int { kSuccess, kProblemStatus, kUnknownStatus, kNoRun, kUsageError = 64 };
 
-// Whether the file begins as a rotated trace does once it is compressed. False for what cannot be read twice.
-bool IsCompressed(int descriptor) {
-  unsigned char magic[2] = {};
-  return pread(descriptor, magic, sizeof magic, 0) == sizeof magic && magic[0] == 0x1F && magic[1] == 0x8B;
+struct Options {
+  bool json = false;
+  bool with_details = false;
+  bool problems_only = false;
+  bool check = false;
+  bool show_passwords = false;
+};
+
+void Complain(const std::string& message) { std::fprintf(stderr, "ruv-trace: %s\n", Printable(message).c_str()); }
+
+// Prints runs as the options want them, and counts them.
+class Printer {
+ public:
+  explicit Printer(const Options& options) : options_(options) {}
+
+  void Take(const Run& run) {
+    const std::string_view verdict = Judge(run).word;
+    ++(verdict == kOk ? ok_ : verdict == kProblem ? problems_ : unknown_);
+    if (options_.check) {
+      last_ = run;
+    } else if (!options_.problems_only || verdict != kOk) {
+      Print(run);
+    }
+  }
+
+  // Prints what follows the last run. Returns the exit status that it deserves.
+  ExitStatus Finish() const {
+    const unsigned long runs = ok_ + problems_ + unknown_;
+    if (options_.check) {
+      if (!last_) return kNoRun;
+      std::fputs((options_.json ? JsonLine(*last_, options_.show_passwords) : CheckLine(*last_)).c_str(), stdout);
+      const std::string_view verdict = Judge(*last_).word;
+      return verdict == kOk ? kSuccess : verdict == kProblem ? kProblemStatus : kUnknownStatus;
+    }
+    if (!options_.json && runs > 0) {
+      std::printf("%lu run%s: %lu ok, %lu problem, %lu unknown\n", runs, runs == 1 ? "" : "s", ok_, problems_,
+                  unknown_);
+    }
+    return kSuccess;
+  }
+
+ private:
+  void Print(const Run& run) {
+    if (options_.json) {
+      std::fputs(JsonLine(run, options_.show_passwords).c_str(), stdout);
+      return;
+    }
+    if (!header_printed_) std::fputs(TableHeader().c_str(), stdout);
+    header_printed_ = true;
+    std::fputs(TableLine(run).c_str(), stdout);
+    if (options_.with_details) std::fputs(Details(run, options_.show_passwords).c_str(), stdout);
+  }
+
+  const Options options_;
+  bool header_printed_ = false;
+  unsigned long ok_ = 0;
+  unsigned long problems_ = 0;
+  unsigned long unknown_ = 0;
+  std::optional<Run> last_;
+};
+
+// Reads the files. Returns false, with a message for each, if some were refused.
+bool ReadFiles(const std::vector<std::string>& names, TraceReader& reader) {
+  bool all_read = true;
+  for (const std::string& name : names) {
+    InputFile file(name);
+    reader.BeginFile(name);
+    for (std::string_view line; file.Next(line);) reader.TakeLine(line);
+    const std::string refusal = file.Refusal(reader.FoundRuns());
+    if (refusal.empty()) continue;
+    Complain(refusal);
+    all_read = false;
+  }
+  reader.End();
+  return all_read;
 }
 
-// Reports the runs of one file. Returns false, with a message, when it cannot be opened or read to its end, or is
-// compressed.
-bool ReportFile(const std::string& file, bool json, bool name_file) {
-  const bool standard_input = file == "-";
-  const int descriptor = standard_input ? STDIN_FILENO : open(file.c_str(), O_RDONLY | O_CLOEXEC);
-  int error = descriptor < 0 ? errno : 0;
-  if (descriptor >= 0 && IsCompressed(descriptor)) {
-    std::fprintf(stderr, "ruv-trace: %s is compressed: use zcat %s | ruv-trace -\n", file.c_str(), file.c_str());
-    if (!standard_input) close(descriptor);
-    return false;
+ExitStatus Summarise(const Options& options, const std::vector<std::string>& names) {
+  Printer printer(options);
+  TraceReader reader([&](const Run& run) { printer.Take(run); });
+  const ExitStatus failure = options.check ? kNoRun : kProblemStatus;
+  const bool all_read = ReadFiles(names, reader);
+  if (options.check && !all_read) return failure;
+  const ExitStatus status = printer.Finish();
+  if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
+    Complain(std::string("cannot write: ") + std::strerror(errno));
+    return failure;
   }
-  if (descriptor >= 0) {
-    const std::string heading = name_file ? Printable(file) + ": " : "";
-    TraceReader reader(
-        [&](const Run& run) { std::fputs((json ? JsonLine(run, file) : heading + HumanLine(run)).c_str(), stdout); });
-    LineSource lines(descriptor);
-    std::string_view line;
-    while (lines.Next(line)) reader.Take(line);
-    reader.End();
-    error = lines.Error();
-    if (!standard_input) close(descriptor);
-  }
-  if (error != 0) std::fprintf(stderr, "ruv-trace: cannot read %s: %s\n", file.c_str(), std::strerror(error));
-  return error == 0;
-}
-
-// Whether all output got where it should; a message otherwise.
-bool Written() {
-  if (std::fflush(stdout) == 0 && std::ferror(stdout) == 0) return true;
-  std::perror("ruv-trace: cannot write");
-  return false;
+  return all_read ? status : failure;
 }
 
 }  // namespace
 
 int main(int argc, char** argv) {
-  enum : int { kJson = 'j', kHelpOption = 'h', kVersion = 'V' };
-  static constexpr option kOptions[] = {{"json", no_argument, nullptr, kJson},
-                                        {"help", no_argument, nullptr, kHelpOption},
-                                        {"version", no_argument, nullptr, kVersion},
-                                        {nullptr, 0, nullptr, 0}};
-  bool json = false;
-  for (int letter = 0; (letter = getopt_long(argc, argv, "h", kOptions, nullptr)) != -1;) {
+  Options options;
+  struct Flag {
+    const char* name;
+    bool Options::*value;
+  };
+  static constexpr Flag kFlags[] = {{"json", &Options::json},
+                                    {"long", &Options::with_details},
+                                    {"problems", &Options::problems_only},
+                                    {"check", &Options::check},
+                                    {"show-passwords", &Options::show_passwords}};
+  enum : int { kHelpOption = 'h', kVersion = 'V', kFirstFlag = 256 };
+  std::vector<option> long_options = {{"help", no_argument, nullptr, kHelpOption},
+                                      {"version", no_argument, nullptr, kVersion}};
+  int letter = kFirstFlag;
+  for (const Flag& flag : kFlags) long_options.push_back({flag.name, no_argument, nullptr, letter++});
+  long_options.push_back({});
+  const std::string default_file = std::string(NZEMRUVTAV::kLogDirectory) + "/" + NZEMRUVTAV::kLogFile;
+
+  while ((letter = getopt_long(argc, argv, "h", long_options.data(), nullptr)) != -1) {
     switch (letter) {
-      case kJson:
-        json = true;
-        break;
       case kHelpOption:
-        std::printf(kHelp, DefaultFile().c_str());
-        return Written() ? EXIT_SUCCESS : EXIT_FAILURE;
+        std::printf(kHelp, default_file.c_str());
+        return EXIT_SUCCESS;
       case kVersion:
         std::puts("ruv-trace " RUV_VERSION);
-        return Written() ? EXIT_SUCCESS : EXIT_FAILURE;
-      default:
+        return EXIT_SUCCESS;
+      case '?':
         std::fputs("Try ruv-trace --help.\n", stderr);
         return kUsageError;
+      default:
+        options.*kFlags[letter - kFirstFlag].value = true;
     }
   }
-  std::vector<std::string> files(argv + optind, argv + argc);
-  if (files.empty()) files.push_back(DefaultFile());
-  bool all_read = true;
-  for (const std::string& file : files) all_read = ReportFile(file, json, files.size() > 1) && all_read;
-  return Written() && all_read ? EXIT_SUCCESS : EXIT_FAILURE;
+  std::vector<std::string> names(argv + optind, argv + argc);
+  if (names.empty()) names.push_back(default_file);
+  return Summarise(options, names);
 }

@@ -1,167 +1,182 @@
 #include "report.h"
 
+#include <algorithm>
+#include <nlohmann/json.hpp>
 #include <optional>
+
+#include "passwords.h"
 
 namespace ruv_trace {
 namespace {
 
-constexpr char kHexDigits[] = "0123456789abcdef";
-constexpr std::string_view kReplacementCharacter = "\xEF\xBF\xBD";
+using Json = nlohmann::ordered_json;
 
-unsigned ByteAt(std::string_view text, std::size_t at) { return static_cast<unsigned char>(text[at]); }
+constexpr std::size_t kLineWidth = 80;
 
-std::string Hex(unsigned byte) { return {kHexDigits[byte >> 4U & 0xFU], kHexDigits[byte & 0xFU]}; }
+std::string JsonText(const Json& json) { return json.dump(-1, ' ', false, Json::error_handler_t::replace); }
 
-struct LeadByte {
-  unsigned first;
-  unsigned last;
-  std::size_t length;
-  unsigned second_first;  // of the bytes that may follow it
-  unsigned second_last;
-};
-
-// The well-formed sequences of UTF-8.
-constexpr LeadByte kLeadBytes[] = {
-    {0x00, 0x7F, 1, 0, 0},       {0xC2, 0xDF, 2, 0x80, 0xBF}, {0xE0, 0xE0, 3, 0xA0, 0xBF},
-    {0xE1, 0xEC, 3, 0x80, 0xBF}, {0xED, 0xED, 3, 0x80, 0x9F}, {0xEE, 0xEF, 3, 0x80, 0xBF},
-    {0xF0, 0xF0, 4, 0x90, 0xBF}, {0xF1, 0xF3, 4, 0x80, 0xBF}, {0xF4, 0xF4, 4, 0x80, 0x8F},
-};
-
-// The length of the character at the beginning of a text that is not empty; 0 when it is none.
-std::size_t CharacterLength(std::string_view text) {
-  const unsigned first = ByteAt(text, 0);
-  for (const LeadByte& lead : kLeadBytes) {
-    if (first < lead.first || first > lead.last) continue;
-    if (lead.length > text.size()) return 0;
-    for (std::size_t i = 1; i < lead.length; ++i) {
-      const unsigned from = i == 1 ? lead.second_first : 0x80;
-      const unsigned to = i == 1 ? lead.second_last : 0xBF;
-      if (ByteAt(text, i) < from || ByteAt(text, i) > to) return 0;
-    }
-    return lead.length;
-  }
-  return 0;
+template <typename Text>
+Json OrNull(const std::optional<Text>& text) {
+  return text ? Json(*text) : Json();
 }
 
-// C0, DEL, and C1 in its two-byte form.
+Json UnlessEmpty(const std::string& text) { return text.empty() ? Json() : Json(text); }
+
+std::string Shown(const Command& command, bool show_passwords) {
+  return show_passwords ? command.text : WithoutPasswords(command.text);
+}
+
+Json JsonCalls(const Run& run, bool show_passwords) {
+  Json calls = Json::array();
+  for (const ToolCall& call : run.Known().calls) {
+    calls.push_back({{"verb", call.verb},
+                     {"exit_code", OrNull(call.exit_code)},
+                     {"result", !call.exit_code ? kUnknown
+                                : call.Failed() ? kProblem
+                                                : kOk},
+                     {"meaning", call.Meaning()},
+                     {"command", Shown(call.command, show_passwords)},
+                     {"command_cut", call.command.MayBeCut()}});
+  }
+  return calls;
+}
+
+// Whether a character moves or hides text: DEL, C1, and the marks of writing direction and line end.
 bool IsControl(std::string_view character) {
-  const unsigned first = ByteAt(character, 0);
-  return first < 0x20 || first == 0x7F || (first == 0xC2 && ByteAt(character, 1) < 0xA0);
+  return character == "\x7F" || (character >= "\xC2\x80" && character < "\xC2\xA0") || character == "\xD8\x9C" ||
+         (character >= "\xE2\x80\x8B" && character <= "\xE2\x80\x8F") ||
+         (character >= "\xE2\x80\xA8" && character <= "\xE2\x80\xAE") ||
+         (character >= "\xE2\x81\xA6" && character <= "\xE2\x81\xA9");
 }
 
-std::string JsonString(std::string_view text) {
-  std::string json = "\"";
-  while (!text.empty()) {
-    const std::size_t length = CharacterLength(text);
-    const std::string_view character = text.substr(0, length == 0 ? 1 : length);
-    if (length == 0) {
-      json += kReplacementCharacter;
-    } else if (ByteAt(text, 0) < 0x20) {
-      json += "\\u00" + Hex(ByteAt(text, 0));
-    } else {
-      if (character == "\"" || character == "\\") json += '\\';
-      json += character;
-    }
-    text.remove_prefix(character.size());
+bool StartsCharacter(char byte) { return (static_cast<unsigned char>(byte) & 0xC0U) != 0x80U; }
+
+// Returns the length of the character at the beginning of valid UTF-8.
+std::size_t CharacterLength(std::string_view text) {
+  std::size_t length = 1;
+  while (length < text.size() && !StartsCharacter(text[length])) ++length;
+  return length;
+}
+
+std::size_t Width(std::string_view text) {
+  return static_cast<std::size_t>(std::count_if(text.begin(), text.end(), StartsCharacter));
+}
+
+// Returns the text cut or padded to the width.
+std::string Cell(std::string text, std::size_t width) {
+  if (Width(text) > width) {
+    while (Width(text) > width - 3) text.pop_back();
+    return text + "...";
   }
-  return json + "\"";
+  return text + std::string(width - Width(text), ' ');
 }
 
-std::string JsonOrNull(const std::optional<std::string>& text) { return text ? JsonString(*text) : "null"; }
-std::string JsonUnlessEmpty(std::string_view text) { return text.empty() ? "null" : JsonString(text); }
-std::string JsonBool(bool value) { return value ? "true" : "false"; }
-
-// The used values where the trace shows them, otherwise the discovered ones.
-Identity IdentityOf(const Run& run) {
-  const auto either = [](const auto& used, const auto& discovered) { return used ? used : discovered; };
-  return {either(run.used.machine_type, run.discovered.machine_type), either(run.used.system, run.discovered.system),
-          either(run.used.architecture, run.discovered.architecture)};
+std::string InWords(std::string_view value) {
+  std::string words(value);
+  std::replace(words.begin(), words.end(), '_', ' ');
+  return words;
 }
 
-std::string JsonIdentity(const Identity& identity) {
-  return "{\"type\":" + JsonOrNull(identity.machine_type) + ",\"system\":" + JsonOrNull(identity.system) +
-         ",\"architecture\":" + JsonOrNull(identity.architecture) + "}";
-}
-
-std::string JsonCalls(const Run& run) {
-  std::string json;
-  for (const ToolCall& call : run.calls) {
-    json += json.empty() ? "" : ",";
-    json += "{\"verb\":" + JsonString(call.verb) +
-            ",\"exit_code\":" + (call.exit_code ? std::to_string(*call.exit_code) : "null") +
-            ",\"meaning\":" + JsonString(call.Meaning()) + "}";
+// Returns the reason or, without one, the package; and then, if it is certain, whether ruv was started.
+std::string Outcome(const Run& run, std::size_t width) {
+  const Facts& known = run.Known();
+  std::string text = Judge(run).reason;
+  if (text.empty()) {
+    text = (known.package_version.empty() ? "package" : known.package_version) + ": " + InWords(known.package);
   }
-  return "[" + json + "]";
-}
-
-std::string HumanIdentity(const Run& run) {
-  const Identity identity = IdentityOf(run);
-  return "MT " + identity.machine_type.value_or("?") + " " + identity.system.value_or("?") + "/" +
-         identity.architecture.value_or("?");
-}
-
-std::string HumanCalls(const Run& run) {
-  std::string text;
-  for (const ToolCall& call : run.calls) {
-    text += text.empty() ? "" : ", ";
-    text += call.verb + "=" + (call.exit_code ? std::to_string(*call.exit_code) : "?");
-    text.append(" (").append(call.Meaning()).append(")");
-  }
-  return text;
-}
-
-std::string HumanPackage(const Run& run) {
-  if (run.package.empty()) return "";
-  return "package" + (run.package_version.empty() ? "" : " " + run.package_version) + ": " + std::string(run.package);
-}
-
-std::string HumanApplication(const Run& run) {
-  const std::string text = "ruv " + std::string(run.Application());
-  return run.command.empty() ? text : text + ": " + run.command + (run.command_cut ? "..." : "");
+  text = Printable(text);
+  std::string ruv = known.application == kUnknown ? "" : "; ruv " + InWords(known.application);
+  // Only a launch starts ruv: for the others that may be left out.
+  if (known.mode != kLaunchMode && Width(text) + ruv.size() > width) ruv.clear();
+  if (Width(text) + ruv.size() > width) text = Cell(text, width - ruv.size());
+  return text + ruv;
 }
 
 }  // namespace
 
+Verdict Judge(const Run& run) {
+  const std::string problem = run.Problem();
+  if (!problem.empty()) return {kProblem, problem};
+  const std::string unclear = run.Unclear();
+  if (!unclear.empty()) return {kUnknown, unclear};
+  return {kOk, ""};
+}
+
+std::string TableHeader() { return "RUN VERDICT MACHINE DID    PACKAGE AND RUV, OR WHAT IS WRONG\n"; }
+
+std::string TableLine(const Run& run) {
+  const std::string number = std::to_string(run.number);
+  const std::string machine = Printable(run.Machine().machine_type.value_or("?"));
+  const std::string mode = run.Known().mode == kUnknown ? "?" : std::string(run.Known().mode);
+  const std::string columns = std::string(number.size() < 3 ? 3 - number.size() : 0, ' ') + number + " " +
+                              Cell(std::string(Judge(run).word), 7) + " " + Cell(machine, 7) + " " + Cell(mode, 6) +
+                              " ";
+  return columns + Outcome(run, kLineWidth - Width(columns)) + "\n";
+}
+
+std::string Details(const Run& run, bool show_passwords) {
+  const Facts& known = run.Known();
+  const Identity machine = run.Machine();
+  std::string text;
+  const auto add = [&text](const std::string& line) { text += "      " + Printable(line) + "\n"; };
+  add("line " + std::to_string(run.line) + " of " + run.file + ", machine " + machine.machine_type.value_or("?") + " " +
+      machine.system.value_or("?") + "/" + machine.architecture.value_or("?"));
+  if (const std::string reason = Judge(run).reason; !reason.empty()) add("reason: " + reason);
+  for (const ToolCall& call : known.calls) {
+    add(call.verb + (call.exit_code ? " " + std::to_string(*call.exit_code) : "") + ": " + std::string(call.Meaning()));
+    add("  " + Shown(call.command, show_passwords) + (call.command.MayBeCut() ? "..." : ""));
+  }
+  if (!known.command.text.empty()) {
+    add("command: " + Shown(known.command, show_passwords) + (known.command.MayBeCut() ? "..." : ""));
+  }
+  return text;
+}
+
+std::string CheckLine(const Run& run) {
+  return std::string(Judge(run).word) + ": " + Outcome(run, std::string::npos) + " (run " + std::to_string(run.number) +
+         ")\n";
+}
+
+std::string JsonLine(const Run& run, bool show_passwords) {
+  const Facts& known = run.Known();
+  const Identity machine = run.Machine();
+  const Verdict verdict = Judge(run);
+  const Json json = {{"file", run.file},
+                     {"line", run.line},
+                     {"run", run.number},
+                     {"verdict", verdict.word},
+                     {"reason", UnlessEmpty(verdict.reason)},
+                     {"machine_type", OrNull(machine.machine_type)},
+                     {"operating_system", OrNull(machine.system)},
+                     {"architecture", OrNull(machine.architecture)},
+                     {"mode", known.mode},
+                     {"package", known.package},
+                     {"package_version", UnlessEmpty(known.package_version)},
+                     {"ruv", known.application},
+                     {"command", UnlessEmpty(Shown(known.command, show_passwords))},
+                     {"command_cut", !known.command.text.empty() && known.command.MayBeCut()},
+                     {"tool_calls", JsonCalls(run, show_passwords)}};
+  return JsonText(json) + "\n";
+}
+
 std::string Printable(std::string_view text) {
+  // The library's strings escape control characters and replace invalid UTF-8; what is left is to undo two escapes and
+  // to escape a few more characters.
+  const std::string quoted = JsonText(std::string(text));
+  std::string_view rest = std::string_view(quoted).substr(1, quoted.size() - 2);
   std::string printable;
-  while (!text.empty()) {
-    const std::size_t length = CharacterLength(text);
-    const std::string_view character = text.substr(0, length == 0 ? 1 : length);
-    if (length == 0 || IsControl(character)) {
-      for (const char byte : character) printable += "\\x" + Hex(static_cast<unsigned char>(byte));
+  while (!rest.empty()) {
+    if (rest[0] == '\\' && (rest[1] == '\\' || rest[1] == '"')) rest.remove_prefix(1);
+    const std::string_view character = rest.substr(0, CharacterLength(rest));
+    if (IsControl(character)) {
+      const std::string escaped = Json(std::string(character)).dump(-1, ' ', true);
+      printable.append(escaped, 1, escaped.size() - 2);
     } else {
       printable += character;
     }
-    text.remove_prefix(character.size());
+    rest.remove_prefix(character.size());
   }
   return printable;
-}
-
-std::string HumanLine(const Run& run) {
-  std::string line = "run " + std::to_string(run.number) + ", line " + std::to_string(run.line);
-  const auto add = [&line](std::string_view column) {
-    if (!column.empty()) line.append("  ").append(column);
-  };
-  add(HumanIdentity(run));
-  add(run.Mode());
-  add(HumanCalls(run));
-  add(HumanPackage(run));
-  add(run.Ended());
-  add(run.mixed ? "mixed with another run" : "");
-  add(run.lines_missing ? "lines missing" : "");
-  add(HumanApplication(run));
-  return Printable(line) + "\n";
-}
-
-std::string JsonLine(const Run& run, std::string_view file) {
-  return "{\"file\":" + JsonString(file) + ",\"run\":" + std::to_string(run.number) +
-         ",\"line\":" + std::to_string(run.line) + ",\"machine\":" + JsonIdentity(IdentityOf(run)) +
-         ",\"discovered\":" + JsonIdentity(run.discovered) + ",\"mode\":" + JsonUnlessEmpty(run.Mode()) +
-         ",\"tool_calls\":" + JsonCalls(run) + ",\"package\":" + JsonUnlessEmpty(run.package) +
-         ",\"package_version\":" + JsonUnlessEmpty(run.package_version) +
-         ",\"application\":" + JsonString(run.Application()) + ",\"command\":" + JsonUnlessEmpty(run.command) +
-         ",\"command_cut\":" + JsonBool(run.command_cut) + ",\"ended\":" + JsonString(run.Ended()) +
-         ",\"mixed\":" + JsonBool(run.mixed) + ",\"lines_missing\":" + JsonBool(run.lines_missing) + "}\n";
 }
 
 }  // namespace ruv_trace

@@ -1,3 +1,4 @@
+// A run in the words of the output.
 #ifndef RUV_TRACE_REPORT_H
 #define RUV_TRACE_REPORT_H
 
@@ -8,15 +9,25 @@
 
 namespace ruv_trace {
 
-// Both return one line with its line feed, whatever bytes the trace holds.
+inline constexpr std::string_view kOk = "ok";
+inline constexpr std::string_view kProblem = "problem";
 
-// For people. Control characters and what is no UTF-8 read \xHH, so that a trace cannot steer a terminal.
-std::string HumanLine(const Run& run);
+struct Verdict {
+  std::string_view word;  // "ok", "problem", "unknown"
+  std::string reason;     // empty if ok
+};
+Verdict Judge(const Run& run);
 
-// For programs: one JSON object. What is no UTF-8 becomes U+FFFD, the replacement character.
-std::string JsonLine(const Run& run, std::string_view file);
+// The lines end with a line feed; none contains a control character.
+std::string TableHeader();
+std::string TableLine(const Run& run);
+// Returns the details that --long adds, on several indented lines.
+std::string Details(const Run& run, bool show_passwords);
+// Returns the line of --check.
+std::string CheckLine(const Run& run);
+std::string JsonLine(const Run& run, bool show_passwords);
 
-// The text as HumanLine shows it.
+// Returns the text with control characters and invalid UTF-8 made visible.
 std::string Printable(std::string_view text);
 
 }  // namespace ruv_trace

@@ -1,6 +1,7 @@
 #include "run.h"
 
 #include <algorithm>
+#include <charconv>
 #include <initializer_list>
 
 #include "log/trace_format.h"
@@ -9,33 +10,31 @@
 namespace ruv_trace {
 namespace {
 
-// A run calls the package tool five times at most; a trace that says otherwise is none.
-constexpr std::size_t kMostCalls = 16;
-
-constexpr std::string_view kApplicationCommandBegins = "[Status:]InvokeRUV: command = ";
-constexpr std::string_view kCommandEnd = " 2>/dev/null";  // unless the user wants to see standard error
-constexpr std::size_t kLongestCommand = NZEMRUVTAV::kMessageBufferSize - 1 - kApplicationCommandBegins.size();
-
-constexpr std::string_view kExpanding = "expansion unfinished";
-constexpr std::string_view kExpanded = "expanded, not installed";
-constexpr std::string_view kNotExpanded = "not installed: expansion failed";
-constexpr std::string_view kNoScript = "not installed: it has no copy script";
-constexpr std::string_view kScriptStarted = "copy script unfinished";
-constexpr std::string_view kScriptRan = "copy script ran";
-
 bool IsOneOf(std::string_view word, std::initializer_list<std::string_view> words) {
   return std::find(words.begin(), words.end(), word) != words.end();
 }
 
-// "SCRIPT" "DIRECTORY" "DIRECTORY" "SOURCE" VERSION 1>>..., with nothing for the version when it is not known.
-std::string VersionInCopyCommand(std::string_view command) {
-  const std::size_t quote = command.rfind("\" ");
-  const std::size_t end = command.find(" 1>>", quote + 1);
-  if (quote == std::string_view::npos || end == std::string_view::npos || end < quote + 2) return "";
-  return std::string(command.substr(quote + 2, end - quote - 2));
+bool EndsWith(std::string_view text, std::string_view end) {
+  return text.size() >= end.size() && text.substr(text.size() - end.size()) == end;
 }
 
-// Takes the next word off a command: up to a blank outside of double quotes.
+// Returns the last argument of "SCRIPT" "EXPANSION" "APPLICATION" "SOURCE" VERSION 1>>..., or "" if it is not there.
+std::string VersionIn(std::string_view copy_command) {
+  const std::size_t end = copy_command.rfind(" 1>>");
+  const std::size_t quote = copy_command.rfind("\" ", end);
+  if (end == std::string_view::npos || quote == std::string_view::npos || quote + 2 > end) return "";
+  return std::string(copy_command.substr(quote + 2, end - quote - 2));
+}
+
+// Returns what a shell that could not run the copy script wrote about it: the rest of "sh: ...SCRIPT: REASON".
+std::string ComplaintIn(std::string_view line, std::string_view copy_command) {
+  if (line.substr(0, 4) != "sh: " || copy_command.empty()) return "";
+  const std::string script(copy_command.substr(1, copy_command.find('"', 1) - 1));
+  const std::size_t position = line.find(script + ": ");
+  return position == std::string_view::npos ? "" : std::string(line.substr(position + script.size() + 2));
+}
+
+// Removes the next word from a command, up to a blank outside double quotes, and returns it.
 std::string_view TakeWord(std::string_view& command) {
   bool quoted = false;
   std::size_t length = 0;
@@ -47,165 +46,178 @@ std::string_view TakeWord(std::string_view& command) {
   return word;
 }
 
-}  // namespace
-
-bool Run::Expects(const Message& message) const {
-  if (finished_) return false;
-  switch (message.kind) {
-    case Kind::kBegin:
-      return false;
-    case Kind::kEntry:
-      return where_ == CallerOf(message.member) && !awaits_tool_exit_;
-    case Kind::kExit:
-      return where_ == message.member && !awaits_tool_exit_ && !LacksItsCommand();
-    case Kind::kIdentity:
-      return where_ == message.member && !(discovered.*message.field);
-    case Kind::kPortableTest:
-      return where_ == kDriver || where_ == kDownload;
-    case Kind::kToolCommand:
-      return where_ == message.member && !awaits_tool_exit_;
-    case Kind::kToolExit:
-      return awaits_tool_exit_;
-    case Kind::kCopyCommand:
-    case Kind::kNoCopyScript:
-      return where_ == message.member && !in_copy_script_;
-    case Kind::kCopied:  // also where the script's last words took the line of its end along
-      return where_ == kExpansion || in_copy_script_;
-    case Kind::kApplicationCommand:
-      return where_ == message.member && command.empty();
-  }
-  return false;
-}
-
-// Whether the run is in a member that traces a command before it ends, and has not yet.
-bool Run::LacksItsCommand() const {
-  if (where_ == kLaunch) return command.empty();
-  return where_ == kCopying && !in_copy_script_ && package != kNoScript;
-}
-
-void Run::Take(const Message& message) {
-  lines_missing = lines_missing || (message.kind != Kind::kBegin && !Expects(message));
-  if (message.kind != Kind::kToolExit) awaits_tool_exit_ = false;
-  if (message.member != kOutside && message.kind != Kind::kPortableTest) {
-    where_ = message.kind == Kind::kExit ? CallerOf(message.member) : message.member;
-    entered_ |= 1U << message.member;
-    in_copy_script_ = false;
-  }
-  switch (message.kind) {
-    case Kind::kBegin:
-      break;
-    case Kind::kEntry:
-      if (message.member == kExpansion) package = kExpanding;
-      break;
-    case Kind::kExit:
-      if (message.member == kSessionEnd) finished_ = true;
-      if (message.member == kCopying && package == kScriptStarted) package = kScriptRan;
-      break;
-    case Kind::kIdentity:
-      discovered.*message.field = message.text;
-      break;
-    case Kind::kPortableTest:
-      portable_tested_ = true;
-      break;
-    case Kind::kToolCommand:
-      awaits_tool_exit_ = true;
-      AddCall(ParseToolCommand(message.text, used));
-      break;
-    case Kind::kToolExit:
-      TakeToolExit(message.exit_code);
-      break;
-    case Kind::kCopyCommand:
-      in_copy_script_ = true;
-      package = kScriptStarted;
-      package_version = VersionInCopyCommand(message.text);
-      break;
-    case Kind::kNoCopyScript:
-      package = kNoScript;
-      break;
-    case Kind::kCopied:
-      package = kScriptRan;
-      break;
-    case Kind::kApplicationCommand:
-      command.clear();
-      TakeCommand(message.text);
-      break;
-  }
-  last_kind_ = message.kind;
-  last_member_ = message.member;
-}
-
-void Run::AddCall(const ToolCall& call) {
-  if (calls.size() == kMostCalls) {
-    calls.pop_back();
-    lines_missing = true;
-  }
-  calls.push_back(call);
-}
-
-void Run::TakeToolExit(int exit_code) {
-  if (!awaits_tool_exit_ || calls.empty()) AddCall({});
-  awaits_tool_exit_ = false;
-  calls.back().exit_code = exit_code;
-  const int result = calls.back().Result();
-  if (where_ == kExpansion)
-    package = result == NZEMRUVTAV::kSuccess || result == NZEMRUVTAV::kNoPayload ? kExpanded : kNotExpanded;
-}
-
-void Run::TakeCommand(std::string_view text) {
-  command += text.substr(0, kLongestCommand - command.size());
-  command_cut = command.size() == kLongestCommand;
-}
-
-void Run::TakeContinuation(std::string_view text) {
-  const std::size_t redirection = command.rfind(kCommandEnd);
-  const bool whole = redirection != std::string::npos && redirection + kCommandEnd.size() == command.size();
-  if (last_kind_ != Kind::kApplicationCommand || command_cut || whole) return;
-  TakeCommand("\n");
-  TakeCommand(text);
-}
-
-std::string_view Run::Mode() const {
-  if (Entered(kDownload)) return "update";
-  // Both modes begin with the online check, and only the successful one of an update goes on from there.
-  if (Entered(kCheck)) {
-    return finished_ && !lines_missing && !calls.empty() && calls[0].Result() == NZEMRUVTAV::kSuccess
-               ? "check"
-               : "check or update";
-  }
-  if (Entered(kLaunch) || Entered(kImport)) return "launch";
-  return !lines_missing && portable_tested_ ? "launch" : "";
-}
-
-// No question is asked on a machine that a package was just installed for, in batch mode, with an input file and for a
-// remote target. An argument that holds blanks and a dash is on the command as it was typed, so that one with such a
-// word inside it looks the same; nobody writes that by chance.
-bool Run::CannotHaveAsked() const {
-  if (package == kScriptRan) return true;
-  std::string_view rest = command;
+// Whether the application's command shows that -b, -i or -r was given. An argument that holds blanks and a dash is in
+// the command as typed, and looks like several; that is not told apart.
+bool SuppressesQuestion(const Command& command) {
+  std::string_view rest = command.text;
   TakeWord(rest);  // the application
   while (!rest.empty()) {
-    const std::string_view word = TakeWord(rest);
-    if (rest.empty() && command_cut) return false;  // the word may be longer
-    if (IsOneOf(word, {"-b", "-i", "-r", "--ipmi-lan", "--vmware-esxi"})) return true;
-    if (!IsOneOf(word, {"-d", "-html"})) continue;
-    const std::string_view value = TakeWord(rest);
-    if (rest.empty() && command_cut) return false;
-    if (IsOneOf(value, {"\"-b\"", "\"-i\"", "\"-r\"", "\"--ipmi-lan\"", "\"--vmware-esxi\""})) return true;
+    std::string_view word = TakeWord(rest);
+    const bool takes_value = IsOneOf(word, {"-d", "-html"});
+    if (takes_value) word = TakeWord(rest);
+    if (rest.empty() && command.MayBeCut()) return false;  // the word may be longer
+    if (takes_value ? IsOneOf(word, {"\"-b\"", "\"-i\"", "\"-r\""}) : IsOneOf(word, {"-b", "-i", "-r"})) return true;
   }
   return false;
 }
 
-std::string_view Run::Application() const {
-  if (command.empty()) return lines_missing || where_ == kLaunch ? "unknown" : "not started";
-  if (CannotHaveAsked()) return "started";
-  return where_ == kLaunch ? "unknown" : "started or declined";
+}  // namespace
+
+bool Run::TakeSystem(std::string_view text) {
+  facts_.discovered.system = text;
+  return true;
 }
 
-std::string_view Run::Ended() const {
-  if (finished_) return "completed";
-  // The driver's next step follows at once, and writes a line.
-  const bool options_read_last = last_kind_ == Kind::kExit && last_member_ == kOptions;
-  return options_read_last ? "options rejected, or cut short" : EndedIn(where_);
+bool Run::TakeMachineType(std::string_view text) {
+  facts_.discovered.machine_type = text;
+  return true;
+}
+
+bool Run::TakeArchitecture(std::string_view text) {
+  facts_.discovered.architecture = text;
+  return true;
+}
+
+bool Run::TakeCheck(std::string_view) {
+  facts_.mode = kCheckMode;
+  return true;
+}
+
+bool Run::TakeDownload(std::string_view) {
+  facts_.mode = kUpdateMode;
+  return true;
+}
+
+bool Run::TakeLaunch(std::string_view) {
+  facts_.mode = kLaunchMode;
+  return true;
+}
+
+// A launch without the test for a portable installation: packages are ignored, and no question is asked.
+bool Run::TakeRemoteLaunch(std::string_view) {
+  no_question_ = true;
+  facts_.mode = kLaunchMode;
+  return true;
+}
+
+bool Run::TakeToolCommand(const std::string& verb, std::string_view text) {
+  facts_.calls.push_back({verb, {std::string(text), room_}});
+  facts_.calls.back().ReadIdentity(facts_.used);
+  return true;
+}
+
+bool Run::TakeExitCode(std::string_view text) {
+  int exit_code = 0;
+  const auto [rest, error] = std::from_chars(text.data(), text.data() + text.size(), exit_code);
+  if (error != std::errc() || rest != text.data() + text.size()) return false;
+  ToolCall& call = facts_.calls.back();
+  call.exit_code = exit_code;
+  result_ = call.Result();
+  if (!call.Package().empty()) facts_.package = call.Package();
+  for (const NZEMRUVTAV::ErrMsg& known : NZEMRUVTAV::ErrMsgs) {
+    const std::string_view message = known.message;
+    if (known.exit_code == exit_code) message_due_ = message.substr(0, message.find('\n'));
+  }
+  return true;
+}
+
+bool Run::TakeNoCopyScript(std::string_view) {
+  facts_.package = kNoCopyScriptFound;
+  return true;
+}
+
+bool Run::TakeCopyCommand(std::string_view text) {
+  facts_.copy_command = {std::string(text), room_};
+  facts_.package_version = VersionIn(text);
+  return true;
+}
+
+// The installation makes the machine type a supported one, so that no question is asked.
+bool Run::TakeCopyEnd(std::string_view) {
+  no_question_ = true;
+  if (output_lines_ != 1) facts_.shell_complaint.clear();
+  facts_.package = facts_.shell_complaint.empty() ? kCopyScriptRan : kCopyScriptNotRun;
+  return true;
+}
+
+bool Run::TakeMissingValue(std::string_view text) {
+  facts_.option_without_value = text;
+  return true;
+}
+
+bool Run::TakeCommand(std::string_view text) {
+  facts_.command = {std::string(text), room_};
+  return true;
+}
+
+bool Run::TakeEnd(std::string_view) {
+  if (facts_.package == kUnknown) facts_.package = kNotChecked;
+  if (facts_.mode != kLaunchMode) {
+    facts_.application = kNotStarted;
+  } else {
+    facts_.application = no_question_ || SuppressesQuestion(facts_.command) ? kStarted : kStartedOrDeclined;
+  }
+  return true;
+}
+
+void Run::TakeOther(std::string_view text) {
+  if (RunsCopyScript()) {
+    if (output_lines_++ == 0) facts_.shell_complaint = ComplaintIn(text, facts_.copy_command.text);
+    return;
+  }
+  Command* command = nullptr;
+  if (!facts_.command.text.empty()) {
+    command = &facts_.command;
+  } else if (!facts_.calls.empty() && !facts_.calls.back().exit_code) {
+    command = &facts_.calls.back().command;
+  }
+  if (command == nullptr || EndsWith(command->text, " 2>/dev/null") || EndsWith(command->text, " 2>&1")) return;
+  const std::string more = ("\n" + std::string(text)).substr(0, command->room);
+  command->text += more;
+  command->room -= more.size();
+}
+
+void Run::BeginBeforeEndOf(const Run& other) {
+  run_before = other.number;
+  doubtful_after_ = other.state_;
+  if (other.IsMixed()) certain_ = Facts();
+}
+
+void Run::Doubt(std::string_view reason) {
+  if (!IsMixed()) doubt_ = reason;
+  certain_ = Facts();
+}
+
+Identity Run::Machine() const {
+  const auto either = [](const auto& used, const auto& discovered) { return used ? used : discovered; };
+  const Facts& known = Known();
+  return {either(known.used.machine_type, known.discovered.machine_type),
+          either(known.used.system, known.discovered.system),
+          either(known.used.architecture, known.discovered.architecture)};
+}
+
+std::string Run::Problem() const {
+  const Facts& known = Known();
+  for (const ToolCall& call : known.calls) {
+    if (call.Failed()) return call.verb + " " + std::to_string(*call.exit_code) + ": " + std::string(call.Meaning());
+  }
+  if (known.package == kNoCopyScriptFound) return "the package has no copy script";
+  if (known.package == kCopyScriptNotRun) return "copy script not run: " + known.shell_complaint;
+  if (installed_again) {
+    return known.package_version + " installed again: the last installation did not take";
+  }
+  if (!known.option_without_value.empty()) return "option " + known.option_without_value + " has no value";
+  const Identity& machine = known.discovered;
+  if (machine.system == kUnknown && machine.machine_type == kUnknown && machine.architecture == kUnknown) {
+    return "machine unknown: no system information";
+  }
+  return "";
+}
+
+std::string Run::Unclear() const {
+  if (!doubt_.empty()) return std::string(doubt_);
+  if (certain_) return "unfinished run " + std::to_string(run_before) + " may have gone on in its place";
+  return Finished() ? "" : std::string(Unfinished());
 }
 
 }  // namespace ruv_trace

@@ -1,68 +1,136 @@
-// What the trace tells of one run of the launcher.
+// One run of the launcher as its trace shows it.
 #ifndef RUV_TRACE_RUN_H
 #define RUV_TRACE_RUN_H
 
+#include <cstddef>
+#include <optional>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
-#include "message.h"
 #include "tool_call.h"
 
 namespace ruv_trace {
 
+// The words of the JSON output; see the manual page.
+inline constexpr std::string_view kUnknown = "unknown";
+inline constexpr std::string_view kLaunchMode = "launch";
+inline constexpr std::string_view kCheckMode = "check";
+inline constexpr std::string_view kUpdateMode = "update";
+inline constexpr std::string_view kNotChecked = "not_checked";
+inline constexpr std::string_view kNoCopyScriptFound = "no_copy_script";
+inline constexpr std::string_view kCopyScriptNotRun = "copy_script_not_run";
+inline constexpr std::string_view kCopyScriptRan = "copy_script_ran";
+inline constexpr std::string_view kStarted = "started";
+inline constexpr std::string_view kStartedOrDeclined = "started_or_declined";
+inline constexpr std::string_view kNotStarted = "not_started";
+
+// The messages that begin and end a run, and the one after the first.
+inline constexpr std::string_view kFirstMessage = "[Debug:] Enter: TAVMaster::TAVMaster()";
+inline constexpr std::string_view kSecondMessage = "[Debug:] Entering TAVMaster::GetTAVBinaryPath()";
+inline constexpr std::string_view kLastMessage = "[Debug:] Exiting TAVMaster::~TAVMaster()";
+
+// What the lines of a run say.
+struct Facts {
+  Identity discovered;  // by the launcher
+  Identity used;        // on the package tool's command lines
+  std::string_view mode = kUnknown;
+  std::vector<ToolCall> calls;          // of the package tool
+  std::string_view package = kUnknown;  // what became of it
+  std::string package_version;          // empty if not in the trace
+  Command copy_command;                 // of the package's copy script
+  std::string shell_complaint;          // why the shell could not run the copy script
+  Command command;                      // of the application
+  std::string_view application = kUnknown;
+  std::string option_without_value;
+};
+
 class Run {
  public:
-  // Both count from 1; the line is the one with which the run begins.
-  Run(unsigned long run_number, unsigned long first_line) : number(run_number), line(first_line) {}
+  // Both numbers count from 1; the line is the run's first one in its file.
+  Run(unsigned long run_number, std::string file_name, unsigned long first_line)
+      : number(run_number), file(std::move(file_name)), line(first_line) {}
 
   unsigned long number;
+  std::string file;
   unsigned long line;
-  Identity discovered;  // at the start
-  Identity used;        // by the package tool's commands, which the command line may have given another one
-  std::vector<ToolCall> calls;
-  std::string_view package;  // what became of the repository's package; empty when none was expanded
-  std::string package_version;
-  std::string command;       // of the application
-  bool command_cut = false;  // the launcher's trace keeps so much of a message and no more
-  bool mixed = false;        // with the lines of another run
-  bool lines_missing = false;
+  bool installed_again = false;    // the package that the last installation had installed
+  bool others_unfinished = false;  // when it began
+  unsigned long run_before = 0;    // the number of the unfinished run whose lines may be among this one's, or 0
 
-  // Whether the message is one that can come next.
-  bool Expects(const Message& message) const;
-  // Whatever was expected: a message that was not is one behind lines that are missing.
-  void Take(const Message& message);
-  // Takes a line that no launcher's prefix begins: the rest of the application's command when that has just begun and
-  // an argument holds a line feed.
-  void TakeContinuation(std::string_view text);
+  // Takes a message of the trace. Returns false if no launcher writes it at this point of a run.
+  bool Take(std::string_view message);
+  // Takes a line of something else: of the copy script, or of a command that has a line feed in it.
+  void TakeOther(std::string_view line);
+  // Makes uncertain what comes after the point at which the other run was left.
+  void BeginBeforeEndOf(const Run& other);
+  // Drops everything: a line is out of turn.
+  void Doubt(std::string_view reason);
 
-  bool Finished() const { return finished_; }
-  // What others write into the trace then is the copy script's output.
-  bool RunsCopyScript() const { return in_copy_script_; }
+  bool IsMixed() const { return !doubt_.empty(); }
+  bool IsDoubtful() const { return certain_.has_value(); }
+  bool Finished() const;
+  bool RunsCopyScript() const;
+  // Whether the launcher can end here without a message: after the help text, with rejected options, and without its
+  // own directory.
+  bool MayHaveEnded() const;
 
-  // "launch", "check", "update", "check or update", or empty when it came to neither or the trace does not tell.
-  std::string_view Mode() const;
-  // "started", "not started", "started or declined", or "unknown". The command is in the trace before the question is
-  // asked, and the answer is not.
-  std::string_view Application() const;
-  std::string_view Ended() const;
+  // Returns what is certain.
+  const Facts& Known() const { return certain_ ? *certain_ : facts_; }
+  // Returns the identity on the package tool's command line or, without one, the discovered one.
+  Identity Machine() const;
+  // Returns what failed, or "" if nothing is known to have failed.
+  std::string Problem() const;
+  // Returns why the trace does not show the run's outcome, or "" if it does.
+  std::string Unclear() const;
+
+  // Whether some launcher writes the message at some point.
+  static bool Knows(std::string_view message);
+  // Whether the message is one of those after the application's end, which are the same in all runs.
+  static bool Closes(std::string_view message);
 
  private:
-  bool Entered(Member member) const { return (entered_ >> member & 1U) != 0; }
-  bool LacksItsCommand() const;
-  void AddCall(const ToolCall& call);
-  void TakeToolExit(int exit_code);
-  void TakeCommand(std::string_view text);
-  bool CannotHaveAsked() const;
+  enum State : unsigned char;
+  struct Transition;
+  static const Transition kTransitions[];
 
-  Member where_ = kOutside;
-  Kind last_kind_ = Kind::kBegin;
-  Member last_member_ = kOutside;
-  unsigned entered_ = 0;  // a bit for each member
-  bool portable_tested_ = false;
-  bool awaits_tool_exit_ = false;
-  bool in_copy_script_ = false;
-  bool finished_ = false;
+  bool IsNext(const Transition& transition, std::string_view message) const;
+
+  // Take the rest of a message. Return false if it cannot be the launcher's.
+  bool TakeSystem(std::string_view text);
+  bool TakeMachineType(std::string_view text);
+  bool TakeArchitecture(std::string_view text);
+  bool TakeCheck(std::string_view text);
+  bool TakeDownload(std::string_view text);
+  bool TakeLaunch(std::string_view text);
+  bool TakeRemoteLaunch(std::string_view text);
+  bool TakeToolCommand(const std::string& verb, std::string_view text);
+  template <const std::string& verb>
+  bool TakeCommandOf(std::string_view text) {
+    return TakeToolCommand(verb, text);
+  }
+  bool TakeExitCode(std::string_view text);
+  bool TakeNoCopyScript(std::string_view text);
+  bool TakeCopyCommand(std::string_view text);
+  bool TakeCopyEnd(std::string_view text);
+  bool TakeMissingValue(std::string_view text);
+  bool TakeCommand(std::string_view text);
+  bool TakeEnd(std::string_view text);
+
+  // Returns where the run was when its trace ended.
+  std::string_view Unfinished() const;
+
+  State state_ = {};
+  int result_ = 0;                  // of the last tool call
+  std::string_view message_due_;    // the message of a known exit code, which must come next
+  std::size_t room_ = 0;            // bytes that the last message could have been longer
+  unsigned long output_lines_ = 0;  // of the copy script
+  bool no_question_ = false;        // the user was not asked whether to go on
+  Facts facts_;
+  std::optional<State> doubtful_after_;
+  std::optional<Facts> certain_;  // what was certain before the doubt
+  std::string_view doubt_;
 };
 
 }  // namespace ruv_trace

@@ -1,24 +1,48 @@
 #include "tool_call.h"
 
+#include <algorithm>
+#include <iterator>
+
+#include "launcher/command_fragments.h"
 #include "packages/exit_code_tables.h"
 
 namespace ruv_trace {
 namespace {
 
-// What the message table has no words for: exit codes of the shell, and of a shell that could not be started.
+struct Verb {
+  const std::string& name;
+  std::string_view success;  // in words
+  std::string_view package_after_success;
+  std::string_view package_after_failure;
+};
+
+const Verb& VerbOf(const ToolCall& call) {
+  static const Verb kVerbs[] = {
+      {NZEMRUVTAV::TAVTOOL_CMD_COMPWEB, "update available", kAvailable, kCheckFailed},
+      {NZEMRUVTAV::TAVTOOL_CMD_ACQUIRE, "success", kDownloaded, kDownloadFailed},
+      {NZEMRUVTAV::TAVTOOL_CMD_COMPLOC, "nothing newer", kNothingNewer, kCheckFailed},
+      {NZEMRUVTAV::TAVTOOL_CMD_EXPAND, "success", kExpanded, kExpansionFailed},
+      {NZEMRUVTAV::TAVTOOL_CMD_COPY, "success", "", ""},
+  };
+  return *std::find_if(std::begin(kVerbs), std::end(kVerbs), [&](const Verb& verb) { return verb.name == call.verb; });
+}
+
+// Exit codes that the launcher's table has no message for: those of the shell, and of a shell that was not started.
 constexpr NZEMRUVTAV::ErrMsg kNotRun[] = {
     {-1, "no shell could be started"},
     {126, "tavtool cannot be executed"},
     {127, "tavtool not found"},
 };
 
-std::string_view SuccessOf(std::string_view verb) {
-  if (verb == "compareweb") return "update available";
-  if (verb == "comparelocal") return "nothing newer";
-  return "success";
+template <std::size_t size>
+std::string_view MessageOf(int exit_code, const NZEMRUVTAV::ErrMsg (&messages)[size]) {
+  for (const NZEMRUVTAV::ErrMsg& known : messages) {
+    if (known.exit_code == exit_code) return known.message;
+  }
+  return "";
 }
 
-// Takes off the text what stands before the mark, and the mark; nothing when there is none.
+// Removes everything up to and including the mark and returns the part before it. Returns nullopt if there is no mark.
 std::optional<std::string> TakeUntil(std::string_view& text, std::string_view mark) {
   const std::size_t position = text.find(mark);
   if (position == std::string_view::npos) return {};
@@ -36,39 +60,57 @@ int ToolCall::Result() const {
   return NZEMRUVTAV::kFailure;
 }
 
+bool ToolCall::Failed() const {
+  if (!exit_code) return false;
+  const bool in_repository = verb == NZEMRUVTAV::TAVTOOL_CMD_COMPLOC;
+  const bool installs = verb == NZEMRUVTAV::TAVTOOL_CMD_ACQUIRE || verb == NZEMRUVTAV::TAVTOOL_CMD_EXPAND;
+  switch (Result()) {
+    case NZEMRUVTAV::kSuccess:
+      return false;
+    case NZEMRUVTAV::kPackageToInstall:
+      return !in_repository;
+    case NZEMRUVTAV::kNoPayload:
+      return !in_repository && verb != NZEMRUVTAV::TAVTOOL_CMD_EXPAND;
+    default:  // 30 is "You already have the latest version", the others "There's no update available"
+      return installs || (exit_code != 30 && exit_code != 31 && exit_code != 33 && exit_code != 40);
+  }
+}
+
 std::string_view ToolCall::Meaning() const {
   if (!exit_code) return "no exit code";
   switch (Result()) {
     case NZEMRUVTAV::kSuccess:
-      return SuccessOf(verb);
+      return VerbOf(*this).success;
     case NZEMRUVTAV::kPackageToInstall:
-      return verb == "comparelocal" ? "newer package" : "unexpected code";
+      return Failed() ? "unexpected exit code" : "newer package";
     case NZEMRUVTAV::kNoPayload:
-      return verb == "expand" || verb == "comparelocal" ? "no payload" : "unexpected code";
+      return Failed() ? "unexpected exit code" : "no payload";
     default:
       break;
   }
-  for (const NZEMRUVTAV::ErrMsg& known : NZEMRUVTAV::ErrMsgs) {
-    const std::string_view message = known.message;
-    if (known.exit_code == exit_code) return message.substr(0, message.find('\n'));
-  }
-  for (const NZEMRUVTAV::ErrMsg& known : kNotRun) {
-    if (known.exit_code == exit_code) return known.message;
-  }
-  return exit_code > 128 && exit_code <= 128 + 64 ? "unknown code, or ended by a signal" : "unknown code";
+  std::string_view message = MessageOf(*exit_code, NZEMRUVTAV::ErrMsgs);
+  message = message.substr(0, message.find('\n'));
+  if (!message.empty()) return message.substr(0, message.find_last_not_of('.') + 1);
+  message = MessageOf(*exit_code, kNotRun);
+  if (!message.empty()) return message;
+  return *exit_code > 128 ? "unknown exit code, or ended by a signal" : "unknown exit code";
 }
 
-ToolCall ParseToolCommand(std::string_view command, Identity& used) {
-  ToolCall call;
-  // PROGRAM VERB -l "PATH" [-s|-t "PATH"] -m TYPE -o SYSTEM -a ARCHITECTURE ...; the program's path may hold blanks.
-  const std::optional<std::string> beginning = TakeUntil(command, " -l \"");
-  if (!beginning) return call;
-  call.verb = beginning->substr(beginning->rfind(' ') + 1);
-  if (!TakeUntil(command, "\" -m ")) return call;
-  if (const auto type = TakeUntil(command, " -o ")) used.machine_type = type;
-  if (const auto system = TakeUntil(command, " -a ")) used.system = system;
-  if (const auto architecture = TakeUntil(command, " ")) used.architecture = architecture;
-  return call;
+std::string_view ToolCall::Package() const {
+  if (Failed()) return VerbOf(*this).package_after_failure;
+  const int result = Result();
+  if (result == NZEMRUVTAV::kPackageToInstall) return kAvailable;
+  if (result == NZEMRUVTAV::kFailure) return verb == NZEMRUVTAV::TAVTOOL_CMD_COPY ? "" : kNothingNewer;
+  return VerbOf(*this).package_after_success;
+}
+
+void ToolCall::ReadIdentity(Identity& identity) const {
+  // PROGRAM VERB -l "PATH" [-s|-t "PATH"] -m TYPE -o SYSTEM -a ARCHITECTURE ...
+  std::string_view rest = command.text;
+  if (!TakeUntil(rest, "\" -m ")) return;
+  if (const auto type = TakeUntil(rest, " -o ")) identity.machine_type = type;
+  if (const auto system = TakeUntil(rest, " -a ")) identity.system = system;
+  if (const auto architecture = TakeUntil(rest, " ")) identity.architecture = architecture;
 }
 
 }  // namespace ruv_trace

@@ -1,28 +1,53 @@
+// A call of the package tool, as the trace shows it.
 #ifndef RUV_TRACE_TOOL_CALL_H
 #define RUV_TRACE_TOOL_CALL_H
 
+#include <cstddef>
 #include <optional>
 #include <string>
 #include <string_view>
 
-#include "message.h"
-
 namespace ruv_trace {
 
-struct ToolCall {
-  std::string verb = "unknown";
-  std::optional<int> exit_code = {};  // nothing: the trace has none
-
-  // What the launcher makes of the exit code: 0 success, 2 a package to install, 3 no payload, 1 everything else.
-  int Result() const;
-
-  // The exit code in a few words.
-  std::string_view Meaning() const;
+struct Identity {
+  std::optional<std::string> machine_type;
+  std::optional<std::string> system;
+  std::optional<std::string> architecture;
 };
 
-// Reads the verb off a command of the package tool, and the identity that it was given into used, as far as the command
-// shows them: it may be cut.
-ToolCall ParseToolCommand(std::string_view command, Identity& used);
+// A traced command. The launcher cuts a message at 511 bytes: with no room left, the end may be missing.
+struct Command {
+  std::string text;
+  std::size_t room = 0;  // bytes that the message could have been longer
+
+  bool MayBeCut() const { return room == 0; }
+};
+
+// What became of the package after a tool call; see the manual page.
+inline constexpr std::string_view kNothingNewer = "nothing_newer";
+inline constexpr std::string_view kAvailable = "available";
+inline constexpr std::string_view kCheckFailed = "check_failed";
+inline constexpr std::string_view kDownloaded = "downloaded";
+inline constexpr std::string_view kDownloadFailed = "download_failed";
+inline constexpr std::string_view kExpanded = "expanded";
+inline constexpr std::string_view kExpansionFailed = "expansion_failed";
+
+struct ToolCall {
+  std::string verb;
+  Command command;
+  std::optional<int> exit_code = {};  // empty if not in the trace
+
+  // Returns what the launcher makes of the exit code: one of the results in exit_code_tables.h.
+  int Result() const;
+  // True if the code says that something went wrong. That there is no newer package is not wrong.
+  bool Failed() const;
+  // Returns the exit code's meaning in words.
+  std::string_view Meaning() const;
+  // Returns what became of the package, or "" if the call does not change that.
+  std::string_view Package() const;
+  // Sets the values that the command gives for the machine.
+  void ReadIdentity(Identity& identity) const;
+};
 
 }  // namespace ruv_trace
 

@@ -1,8 +1,5 @@
 #include "trace_reader.h"
 
-#include <algorithm>
-#include <optional>
-
 #include "log/trace_format.h"
 
 namespace ruv_trace {
@@ -10,58 +7,126 @@ namespace {
 
 constexpr std::string_view kPrefix = NZEMRUVTAV::kLinePrefix;
 
+// After so many runs that ended in turn, an unfinished one is taken for dead.
+constexpr std::size_t kMostHeld = 20;
+
+constexpr std::string_view kMixed = "mixed with another run, or lines are missing";
+constexpr std::string_view kHeadless = "its beginning is missing";
+
 }  // namespace
 
-void TraceReader::Take(std::string_view line) {
-  ++line_number_;
-  const bool prefixed = line.compare(0, kPrefix.size(), kPrefix) == 0;
-  std::optional<Message> message = prefixed ? ParseMessage(line.substr(kPrefix.size())) : std::nullopt;
-  if (!message) {
-    // Behind what was written without a line feed, such as the copy script's last words, stands the launcher's line.
-    const std::size_t prefix = line.rfind(kPrefix);
-    if (prefix != std::string_view::npos && prefix > 0) message = ParseMessage(line.substr(prefix + kPrefix.size()));
+void TraceReader::BeginFile(const std::string& name) {
+  file_ = name;
+  line_ = 0;
+  found_runs_ = false;
+}
+
+void TraceReader::TakeLine(std::string_view line) {
+  ++line_;
+  const bool prefixed = line.substr(0, kPrefix.size()) == kPrefix;
+  if (prefixed && TakeMessage(line.substr(kPrefix.size()))) return;
+  // The last words of a copy script may lack a line feed: then the launcher's line follows on the same line.
+  const std::size_t position = line.rfind(kPrefix);
+  const bool inside = position != std::string_view::npos && position > 0;
+  if (inside && TakeMessage(line.substr(position + kPrefix.size()))) return;
+  if ((prefixed || inside) && !(run_ && run_->RunsCopyScript())) {
+    TakeOutOfTurn(line.substr(position + kPrefix.size()));
+  } else if (run_) {
+    run_->TakeOther(line);
   }
-  if (message) {
-    TakeMessage(*message);
-  } else if (!prefixed && !runs_.empty()) {
-    runs_.back().TakeContinuation(line);
+}
+
+// Returns false if the message is not the next one of the run.
+bool TraceReader::TakeMessage(std::string_view message) {
+  if (message == kFirstMessage) {
+    BeginRun();
+  } else if (run_ && !run_->IsMixed() && run_->Take(message)) {
+    if (run_->Finished()) EndRun();
+  } else {
+    return false;
   }
+  found_runs_ = true;
+  return true;
 }
 
-void TraceReader::End() {
-  while (!runs_.empty()) ReportFirst();
-}
-
-void TraceReader::TakeMessage(const Message& message) {
-  if (message.kind == Kind::kBegin) return NewRun().Take(message);
-  Run* const run = RunOf(message);
-  if (run == nullptr) return;
-  run->Take(message);
-  if (!run->Finished()) return;
-  while (!runs_.empty() && runs_.front().Finished()) ReportFirst();
-}
-
-// Returns null for what is no line of the launcher's.
-Run* TraceReader::RunOf(const Message& message) {
-  for (auto run = runs_.rbegin(); run != runs_.rend(); ++run) {
-    if (!run->Expects(message)) continue;
-    // An older run that goes on was there all the time, so that any line which both expected may be the other's.
-    if (run != runs_.rbegin()) std::for_each(runs_.rbegin(), run + 1, [](Run& each) { each.mixed = true; });
-    return &*run;
+void TraceReader::BeginRun() {
+  const bool others_unfinished = unfinished_ > 0;
+  after_silent_end_ = run_ && run_->MayHaveEnded() && !run_->IsMixed();
+  if (after_silent_end_) {
+    --unfinished_;
+  } else if (run_) {
+    // Where both of two runs were left is not remembered.
+    if (left_ || run_->IsDoubtful()) run_->Doubt(kMixed);
+    left_ = run_;
+    in_turn_ = 0;
   }
-  // Nobody expects it: lines are missing before it, or a copy script writes what looks like the launcher's.
-  if (runs_.empty() || runs_.back().Finished()) return &NewRun();
-  return runs_.back().RunsCopyScript() ? nullptr : &runs_.back();
+  if (run_) Hold();
+  run_.emplace(++runs_, file_, line_);
+  run_->Take(kFirstMessage);
+  run_->others_unfinished = others_unfinished;
+  if (left_) run_->BeginBeforeEndOf(*left_);
+  ++unfinished_;
 }
 
-Run& TraceReader::NewRun() {
-  if (runs_.size() == kMostRunsHeld) ReportFirst();
-  return runs_.emplace_back(++runs_begun_, line_number_);
+void TraceReader::EndRun() {
+  --unfinished_;
+  if (run_->IsDoubtful()) left_.reset();
+  if (++in_turn_ == kMostHeld) {
+    left_.reset();
+    unfinished_ = 0;
+  }
+  Hold();
+}
+
+// Takes a message that is not the next one of the run: it is another run's, or some are missing before it.
+void TraceReader::TakeOutOfTurn(std::string_view message) {
+  const bool explained = run_ && (left_ || after_silent_end_ || run_->IsMixed());
+  if (run_) {
+    if (!run_->IsMixed() && after_silent_end_) ++unfinished_;  // the run before had not ended after all
+    run_->Doubt(kMixed);
+  } else {
+    if (!Run::Knows(message)) return;
+    if (unfinished_ == 0 || message == kSecondMessage) {
+      ++unfinished_;
+      run_.emplace(++runs_, file_, line_);
+      run_->Doubt(kHeadless);
+    }
+  }
+  found_runs_ = true;
+  in_turn_ = 0;
+  // The runs since an unfinished one may have ended with its lines. Lines that say nothing can be theirs as well.
+  if (!explained && !Run::Closes(message)) {
+    for (Run& each : held_) {
+      if (each.others_unfinished) each.Doubt(kMixed);
+    }
+  }
+  if (message != kLastMessage || unfinished_ == 0 || --unfinished_ > 0) return;
+  left_.reset();
+  if (run_) Hold();
+}
+
+void TraceReader::Hold() {
+  held_.push_back(std::move(*run_));
+  run_.reset();
+  if (held_.size() > kMostHeld) ReportFirst();
 }
 
 void TraceReader::ReportFirst() {
-  report_(runs_.front());
-  runs_.pop_front();
+  Run& run = held_.front();
+  const Facts& known = run.Known();
+  if (!known.copy_command.text.empty() && !known.copy_command.MayBeCut()) {
+    run.installed_again = known.copy_command.text == installed_ && !known.package_version.empty();
+    installed_ = known.copy_command.text;
+  } else if (known.package == kNothingNewer) {
+    installed_.clear();
+  }
+  report_(run);
+  held_.pop_front();
+}
+
+void TraceReader::End() {
+  if (run_) Hold();
+  while (!held_.empty()) ReportFirst();
 }
 
 }  // namespace ruv_trace
