@@ -1,19 +1,22 @@
 #!/usr/bin/env bash
-# Holds the completions for bash and zsh against the usage text: the same options and the same values, no more, no less.
+# Compares the completions for bash and zsh with the usage text: they must offer the same options and values.
 # Usage: tests/completion_test.sh LAUNCHER     (exit status 77, "skipped", without zsh)
 set -euo pipefail
 launcher=$1
 cd "$(dirname "${BASH_SOURCE[0]}")/../completions"
-command -v zsh >/dev/null || exit 77
+if ! command -v zsh >/dev/null; then
+  echo "skipped: zsh is not installed"
+  exit 77
+fi
 
-# Options that the launcher takes although the usage text does not list them.
+# The launcher takes these options although the usage text does not list them.
 unlisted=(--gui --cmd --show_stderr)
 
 usage=$("$launcher" -h | sed '1,/^Options:$/d')
 options() { grep '^-' | grep -oE '(^|[ ,[])--?([a-z][a-z_-]*=?|\?)' | tr -d ' ,['; }
 values_of() { sed -n "/^$1 /,/^ *This/p" <<<"$usage" | grep -oE '\[[a-z0-9.]+\]' | tr -d '[]'; }
 
-# What bash offers behind the words of a command line.
+# Prints what bash offers after the words of a command line.
 in_bash() {
   bash -c 'compopt() { :; }
     source ./launcher.bash
@@ -22,7 +25,7 @@ in_bash() {
     printf "%s\n" "${COMPREPLY[@]}"' bash "$@"
 }
 
-# The option descriptions that zsh's own function gets: "(EXCLUDED)OPTION[TEXT]:WHAT:(VALUES)".
+# The option descriptions passed to zsh's own function: "(EXCLUDED)OPTION[TEXT]:WHAT:(VALUES)".
 zsh_descriptions=$(zsh -fc '_arguments() { print -rl -- "$@" }; source ./launcher.zsh')
 in_zsh() { sed -n "s/^[^:]*$1\[.*:(\(.*\))\$/\1/p" <<<"$zsh_descriptions" | tr ' ' '\n'; }
 

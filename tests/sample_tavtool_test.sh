@@ -1,9 +1,10 @@
 #!/usr/bin/env bash
-# The stand-in for the package tool on real packages: its exit codes, and what it leaves in the directories.
-# Run in a sandbox, as ctest does it.
+# sample/tavtool on real packages: its exit codes and the files that it writes. Run it in a sandbox, as ctest does.
 set -uo pipefail
 sample=$(cd "$(dirname "${BASH_SOURCE[0]}")/../sample" && pwd)
-cd "$(mktemp -d)" || exit 1
+directory=$(mktemp -d)
+trap 'rm -rf "$directory"' EXIT
+cd "$directory" || exit 1
 mkdir -p application/data site repository expanded payload/data
 echo 1.50 >application/data/version
 echo content >payload/data/file
@@ -51,7 +52,7 @@ if mount -t tmpfs -o size=4k full full 2>/dev/null; then
   [[ $(ls -A full) == filler ]] || { echo "a part of a package was left on the full disk" >&2 && ((++failures)); }
   umount full
 else
-  echo "left out: the full disk, which nobody may mount here"
+  echo "not tested: the full disk, since mounting is refused here"
 fi
 expect 60 'cannot write' copy -l site -t nowhere "${identity[@]}"
 expect 1 'unknown verb' compare -l site "${identity[@]}"
