@@ -1,25 +1,26 @@
-// The application's command line, and the question on a machine that the application does not know.
-#include "launcher_fixture.h"
+// The application's command line, and the question on an unsupported machine.
+#include "installation.h"
 
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
-using ::testing::Not;
+using ::testing::PrintToString;
 
-class ApplicationLaunch : public LauncherTest {
- protected:
-  static constexpr const char* kWarning =
-      "You might need to download an update for RUV to support this system.\n"
-      "Use the -? or -h parameter for more information about downloading updates.\n";
-  static constexpr const char* kQuestion = "Do you want to proceed anyway (function may be limited)? (Y/N)";
+namespace {
 
-  void MakeUnsupported() { WriteFile(Directory() + "/data/supportlist.xml", "<MT>9999</MT>\n"); }
-};
+const std::string kWarning =
+    "You might need to download an update for RUV to support this system.\n"
+    "Use the -? or -h parameter for more information about downloading updates.\n";
+const std::string kQuestion = "Do you want to proceed anyway (function may be limited)? (Y/N)";
 
-TEST_F(ApplicationLaunch, SpecialParametersQuoteTheirValue) {
+std::string Repeated(int count, const std::string& text) { return count == 0 ? "" : text + Repeated(count - 1, text); }
+
+}  // namespace
+
+TEST(ApplicationLaunch, QuotesTheValuesOfSpecialParameters) {
   struct Row {
     Strings arguments;
-    std::string command;
+    std::string command;  // after the application's path
     Strings processed;
     Strings missing;
   };
@@ -33,89 +34,85 @@ TEST_F(ApplicationLaunch, SpecialParametersQuoteTheirValue) {
       {{"-D", "-ihtml", "-htm"}, " -D -ihtml -htm 2>/dev/null", {}, {}},
   };
   for (const Row& row : rows) {
-    SCOPED_TRACE(::testing::PrintToString(row.arguments));
-    TearDown();
-    SetUp();
-    EXPECT_EQ(Run(row.arguments).status, 0);
-    EXPECT_THAT(TraceLines("[Status:]InvokeRUV: command = "), ElementsAre("\"@/ruv\"" + row.command));
-    EXPECT_EQ(TraceLines("[Debug:] Processing special parameters ["), row.processed);
-    EXPECT_EQ(TraceLines("[Error:]InvokeRUV: required parameters are missing for option = "), row.missing);
-    EXPECT_THAT(CallsOf("ruv"), ::testing::SizeIs(1));
+    SCOPED_TRACE(PrintToString(row.arguments));
+    const Installation machine;
+    EXPECT_EQ(machine.Run(row.arguments).status, 0);
+    EXPECT_THAT(machine.TraceLines("[Status:]InvokeRUV: command = "), ElementsAre("\"@/ruv\"" + row.command));
+    EXPECT_EQ(machine.TraceLines("[Debug:] Processing special parameters ["), row.processed);
+    EXPECT_EQ(machine.TraceLines("[Error:]InvokeRUV: required parameters are missing for option = "), row.missing);
+    EXPECT_THAT(machine.CallsOf("ruv"), ::testing::SizeIs(1));
   }
 }
 
-TEST_F(ApplicationLaunch, TheQuestionTakesOnlyYAndN) {
+TEST(ApplicationLaunch, AsksUntilTheAnswerIsYOrN) {
   struct Row {
     std::string input;
     int questions;
-    bool started;
+    Strings started;
   };
   const Row rows[] = {
-      {"y\n", 1, true},      {"Y\n", 1, true},
-      {"n\ny\n", 1, false},  {"yes\nno\n y\n\nYy\ny \nN\n", 7, false},
-      {"maybe\ny", 2, true},  // a last line without a line feed
-      {"", 1, false},         // the end of the input
-      {"what\n", 2, false},  {std::string("y\0\ny\r\n", 6), 3, false},
+      {"y\n", 1, {"[-v]"}},
+      {"Y\n", 1, {"[-v]"}},
+      {"n\ny\n", 1, {}},
+      {"yes\nno\n y\n\nYy\ny \nN\n", 7, {}},
+      {"maybe\ny", 2, {"[-v]"}},  // a last line without a line feed
+      {"", 1, {}},                // the end of the input
+      {"what\n", 2, {}},
+      {std::string("y\0\ny\r\n", 6), 3, {}},
   };
   for (const Row& row : rows) {
     SCOPED_TRACE(row.input);
-    TearDown();
-    SetUp();
-    MakeUnsupported();
-    std::string expected = kWarning;
-    for (int i = 0; i < row.questions; ++i) expected += kQuestion;
-    if (!row.started) expected += "Exit RUV\n";
-    const RunResult run = Run({"-v"}, Input(row.input));
+    const Installation machine;
+    machine.MakeUnsupported();
+    const RunResult run = machine.Run({"-v"}, Input(row.input));
     EXPECT_EQ(run.status, 0);
-    EXPECT_EQ(run.out, expected);
-    EXPECT_EQ(CallsOf("ruv"), row.started ? Strings{"[-v]"} : Strings{});
-    EXPECT_THAT(Trace(), HasSubstr("[Status:]InvokeRUV: command = \"@/ruv\" -v 2>/dev/null\n"
-                                   "[TAVRUV]: [Debug:] Exiting TAVMaster::InvokeRUV()\n"));
+    EXPECT_EQ(run.out, kWarning + Repeated(row.questions, kQuestion) + (row.started.empty() ? "Exit RUV\n" : ""));
+    EXPECT_EQ(machine.CallsOf("ruv"), row.started);
+    EXPECT_THAT(machine.Trace(), HasSubstr("[Status:]InvokeRUV: command = \"@/ruv\" -v 2>/dev/null\n"
+                                           "[TAVRUV]: [Debug:] Exiting TAVMaster::InvokeRUV()\n"));
   }
 }
 
-TEST_F(ApplicationLaunch, AnUnreadableAnswerIsNo) {
-  MakeUnsupported();
+// The terminal is non-blocking, as another program may leave it. Each Ctrl-D (\004) ends a read, the second one empty.
+TEST(ApplicationLaunch, WaitsForTheAnswerAndAsksAgainAfterCtrlD) {
+  const Installation machine;
+  machine.MakeUnsupported();
+  EXPECT_EQ(machine.Run({}, Typed("maybe\004\004y\n")).out, kWarning + kQuestion + kQuestion);
+  EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre(""));
+}
+
+TEST(ApplicationLaunch, TakesAnUnreadableAnswerAsNo) {
+  const Installation machine;
+  machine.MakeUnsupported();
   for (const char* input : {"exec </", "exec <&-"}) {
-    EXPECT_EQ(Run({}, Prelude(input)).out, std::string(kWarning) + kQuestion + "Exit RUV\n") << input;
+    EXPECT_EQ(machine.Run({}, Prelude(input)).out, kWarning + kQuestion + "Exit RUV\n") << input;
   }
-  EXPECT_THAT(CallsOf("ruv"), IsEmpty());
+  EXPECT_THAT(machine.CallsOf("ruv"), IsEmpty());
 }
 
-TEST_F(ApplicationLaunch, WhatStandsBehindTheAnswerIsTheApplications) {
-  MakeUnsupported();
-  Install("ruv", "cat");
-  EXPECT_EQ(Run({}, Input("y\nfor the application\n")).out,
-            std::string(kWarning) + kQuestion + "for the application\n");
-  EXPECT_EQ(Run({}, Prelude("mkfifo pipe; printf 'y\\nthrough a pipe\\n' >pipe & exec <pipe")).out,
-            std::string(kWarning) + kQuestion + "through a pipe\n");
+TEST(ApplicationLaunch, LeavesTheInputAfterTheAnswerToTheApplication) {
+  const Installation machine;
+  machine.MakeUnsupported();
+  machine.Install("ruv", "cat");
+  EXPECT_EQ(machine.Run({}, Input("y\nfor the application\n")).out, kWarning + kQuestion + "for the application\n");
+  EXPECT_EQ(machine.Run({}, Prelude("mkfifo pipe; printf 'y\\nthrough a pipe\\n' >pipe & exec <pipe")).out,
+            kWarning + kQuestion + "through a pipe\n");
 }
 
-TEST_F(ApplicationLaunch, WhenTheWarningIsDue) {
-  struct Row {
-    Strings arguments;
-    std::string out;
+TEST(ApplicationLaunch, WarnsOnlyIfTheMachineTypeMatters) {
+  const std::pair<Strings, std::string> rows[] = {
+      {{"-b"}, kWarning},       {{"-r", "file"}, ""},
+      {{"-i", "5555.xml"}, ""}, {{"--vmware-esxi", "host"}, ""},
+      {{"--ipmi-lan"}, ""},     {{"-v"}, kWarning + kQuestion + "Exit RUV\n"},
   };
-  const Row rows[] = {
-      {{"-b"}, kWarning},
-      {{"-r", "file"}, ""},
-      {{"-i", "5555.xml"}, ""},
-      {{"-i", "9999.xml"}, ""},
-      {{"--vmware-esxi", "host"}, ""},
-      {{"--ipmi-lan"}, ""},
-      {{"-v"}, std::string(kWarning) + kQuestion + "Exit RUV\n"},
-  };
-  MakeUnsupported();
-  for (const Row& row : rows) EXPECT_EQ(Run(row.arguments).out, row.out) << ::testing::PrintToString(row.arguments);
-  // The list may hold the empty machine type, and then an empty one is supported.
-  WriteFile(Directory() + "/data/supportlist.xml", "<MT>");
-  WriteFile(kSystemInformationFile, "ZEM_SYSTEM_MT=\n");
-  EXPECT_EQ(Run({}).out, "");
+  const Installation machine;
+  machine.MakeUnsupported();
+  for (const auto& [arguments, out] : rows) EXPECT_EQ(machine.Run(arguments).out, out) << PrintToString(arguments);
 }
 
-TEST_F(ApplicationLaunch, ALongCommandIsTracedInPartAndRunWhole) {
-  const Strings arguments(3000, "-argument");
-  EXPECT_EQ(Run(arguments).status, 0);
-  EXPECT_EQ(CallsOf("ruv").at(0).size(), 3000 * std::string("[-argument]").size());
-  EXPECT_LE(TraceLines("[Status:]InvokeRUV: command = ").at(0).size(), 511U);
+TEST(ApplicationLaunch, TracesALongCommandInPartAndRunsItWhole) {
+  const Installation machine;
+  EXPECT_EQ(machine.Run(Strings(3000, "-argument")).status, 0);
+  EXPECT_EQ(machine.CallsOf("ruv").at(0).size(), 3000 * std::string("[-argument]").size());
+  EXPECT_LE(machine.TraceLines("[Status:]InvokeRUV: command = ").at(0).size(), 511U);
 }

@@ -1,15 +1,15 @@
-// What becomes of the package tool's exit codes, seen in runs and, for the statuses that no run gives, in a call.
+// The package tool's exit codes: each step's result, and the message for the user.
 #include <filesystem>
-#include <set>
+#include <regex>
+#include <sstream>
 
+#include "installation.h"
 #include "launcher/tav.h"
-#include "launcher_fixture.h"
+#include "packages/exit_code_tables.h"
 
 namespace fs = std::filesystem;
 
-class ExitCodes : public LauncherTest {};
-
-TEST_F(ExitCodes, ResultsAndMessages) {
+TEST(ExitCodes, GiveResultsAndMessages) {
   const std::string none = "There's no update available for this system on internet currently.\n";
   const std::string corrupted =
       "Error, package corrupted or not enough free space on disk.\n"
@@ -30,30 +30,51 @@ TEST_F(ExitCodes, ResultsAndMessages) {
        "If you need to access internet through proxy, please use --proxy and try again.\n"},
   };
   const std::map<int, int> results = {{0, 0}, {32, 0}, {21, 2}, {52, 3}, {61, 3}};
-  NZEMRUVTAV::TAVMaster session;
+  const Installation machine;
+  const NZEMRUVTAV::TAVMaster session;
   for (int exit_code = -1; exit_code <= 256; ++exit_code) {
+    SCOPED_TRACE(exit_code);
     fs::remove(kTraceFile);
     ::testing::internal::CaptureStdout();
     const int result = session.HandleTAVToolReturnValue(exit_code == -1 ? -1 : exit_code << 8);
     const std::string out = ::testing::internal::GetCapturedStdout();
     const bool known = messages.count(exit_code) != 0;
-    EXPECT_EQ(result, results.count(exit_code) != 0 ? results.at(exit_code) : 1) << exit_code;
-    EXPECT_EQ(out, known ? messages.at(exit_code) : "") << exit_code;
-    EXPECT_EQ(Trace(), "[TAVRUV]: [Status:]Return Code from tavtool = " + std::to_string(exit_code) + "\n" +
-                           (known ? "[TAVRUV]: " + messages.at(exit_code) : ""))
-        << exit_code;
+    EXPECT_EQ(result, results.count(exit_code) != 0 ? results.at(exit_code) : 1);
+    EXPECT_EQ(out, known ? messages.at(exit_code) : "");
+    EXPECT_EQ(machine.Trace(), "[TAVRUV]: [Status:]Return Code from tavtool = " + std::to_string(exit_code) + "\n" +
+                                   (known ? "[TAVRUV]: " + messages.at(exit_code) : ""));
   }
 }
 
-TEST_F(ExitCodes, AToolThatCannotBeRunIsASilentFailure) {
-  fs::create_directory(kRepository);
-  fs::remove(Directory() + "/tavtool");
-  EXPECT_EQ(Run({}).out, "");
-  WriteFile(Directory() + "/tavtool", "not executable");
-  EXPECT_EQ(Run({}).out, "");
-  // An exit code of 2 is no interrupt.
-  Install("tavtool", "exit 2");
-  EXPECT_EQ(Run({}).out, "");
-  EXPECT_THAT(TraceLines("[Status:]Return Code from tavtool = "), ::testing::ElementsAre("127", "126", "2"));
-  EXPECT_THAT(CallsOf("ruv"), ::testing::SizeIs(3));
+TEST(ExitCodes, AreAllInTheManual) {
+  std::map<int, std::string> in_table;
+  for (const NZEMRUVTAV::ErrMsg& known : NZEMRUVTAV::ErrMsgs) {
+    in_table[known.exit_code] = std::regex_replace(known.message, std::regex("\n"), " ");
+  }
+  // An item such as: .It Sy 31 , 33 Dq There's no update available
+  std::map<int, std::string> in_manual;
+  const std::regex item("\\.It (.*) Dq (.*)"), number("[0-9]+");
+  std::istringstream page(ReadFile(MANUAL_PAGE));
+  for (std::string line; std::getline(page, line);) {
+    std::smatch parts;
+    if (!std::regex_match(line, parts, item)) continue;
+    const std::string codes = parts[1];
+    for (std::sregex_iterator code(codes.begin(), codes.end(), number); code != std::sregex_iterator(); ++code) {
+      in_manual[std::stoi(code->str())] = parts[2];
+    }
+  }
+  EXPECT_EQ(in_manual, in_table);
+}
+
+TEST(ExitCodes, OfAToolThatCannotRunAreSilentFailures) {
+  const Installation machine;
+  machine.CreateRepository();
+  fs::remove(machine.Directory() + "/tavtool");
+  EXPECT_EQ(machine.Run().out, "");
+  WriteFile(machine.Directory() + "/tavtool", "not executable");
+  EXPECT_EQ(machine.Run().out, "");
+  machine.InstallTool({{"comparelocal", 2}});  // exit code 2 is not signal 2, an interrupt
+  EXPECT_EQ(machine.Run().out, "");
+  EXPECT_THAT(machine.TraceLines("[Status:]Return Code from tavtool = "), ::testing::ElementsAre("127", "126", "2"));
+  EXPECT_THAT(machine.CallsOf("ruv"), ::testing::SizeIs(3));
 }

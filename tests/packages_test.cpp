@@ -1,167 +1,159 @@
-// The package steps: the commands that they run, the directories that they make, the version that they hand on.
+// The package steps: their commands, the directories that they make, the version that they pass on.
 #include <filesystem>
 
-#include "launcher_fixture.h"
+#include "installation.h"
 
 using ::testing::ElementsAre;
+using ::testing::EndsWith;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 
 namespace fs = std::filesystem;
 
-class Packages : public LauncherTest {};
-
-TEST_F(Packages, OnlineCommandsCarryTheForwardedArguments) {
-  EXPECT_EQ(Run({"--update", "-x", "two words", "--Proxy=1"}).status, 0);
-  EXPECT_THAT(
-      TraceLines("[Status:]CheckUpdate:TAVToolCmd = "),
-      ElementsAre("\"@/tavtool\" compareweb -l \"@\" -m 1234 -o rhel5 -a 64 --latest -x \"two words\" --Proxy=1 "
-                  "2>/dev/null 1>/dev/null 2>&1"));
-  EXPECT_THAT(TraceLines("[Status:]AcquireUpdate: command = "),
-              ElementsAre("mkdir -p /var/ZEM_Support 1>/dev/null 2>&1"));
-  EXPECT_THAT(TraceLines("[Status:]AcquireUpdate: TAVToolCmd = "),
-              ElementsAre("\"@/tavtool\" acquire -l \"/var/ZEM_Support\" -m 1234 -o rhel5 -a 64 --force --latest -x "
-                          "\"two words\" --Proxy=1 2>/dev/null 1>/dev/null 2>&1"));
-  EXPECT_THAT(CallsOf("tavtool"),
+TEST(Packages, OnlineCommandsGetTheForwardedArguments) {
+  const Installation machine;
+  EXPECT_EQ(machine.Run({"--update", "-x", "two words", "--Proxy=1"}).status, 0);
+  EXPECT_THAT(machine.TraceLines("[Status:]CheckUpdate:TAVToolCmd = "),
+              ElementsAre("\"@/tavtool\" compareweb -l \"@\" -m 1234 -o rhel5 -a 64 --latest -x \"two words\" "
+                          "--Proxy=1 2>/dev/null 1>/dev/null 2>&1"));
+  EXPECT_THAT(machine.TraceLines("[Status:]AcquireUpdate: "),
+              ElementsAre("command = mkdir -p /var/ZEM_Support 1>/dev/null 2>&1",
+                          "TAVToolCmd = \"@/tavtool\" acquire -l \"/var/ZEM_Support\" -m 1234 -o rhel5 -a 64 --force "
+                          "--latest -x \"two words\" --Proxy=1 2>/dev/null 1>/dev/null 2>&1"));
+  EXPECT_THAT(machine.CallsOf("tavtool"),
               ElementsAre("[compareweb][-l][@][-m][1234][-o][rhel5][-a][64][--latest][-x][two words][--Proxy=1]",
                           "[acquire][-l][/var/ZEM_Support][-m][1234][-o][rhel5][-a][64][--force][--latest][-x]"
                           "[two words][--Proxy=1]",
                           "[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]"));
-  // With the directory there, and without the redirection of standard error.
-  fs::remove(kTraceFile);
-  Run({"--update", "--show_stderr"});
-  EXPECT_THAT(TraceLines("[Status:]AcquireUpdate: command = "), IsEmpty());
-  EXPECT_THAT(TraceLines("[Status:]CheckUpdate:TAVToolCmd = "),
-              ElementsAre("\"@/tavtool\" compareweb -l \"@\" -m 1234 -o rhel5 -a 64 --latest 1>/dev/null 2>&1"));
 }
 
-// Each step makes the directories that it needs again, without a trace line but for the download's, and shows what it
-// waits for when it waits.
-TEST_F(Packages, DirectoriesThatGoAwayAndTextsThatWait) {
-  InstallCopyScript();
-  Install("tavtool",
-          "cp ../stdout ../stdout.$1; ls -d /var/ZEM_Support >>../seen\n"
-          "case $1 in acquire) rmdir /var/ZEM_Support ;; comparelocal) rmdir /var/ZEM_Support; exit 21 ;; esac");
-  Run({"--update"});
-  EXPECT_THAT(CallsOf("tavtool"), ::testing::SizeIs(4));
-  EXPECT_EQ(ReadFile(Directory() + "/seen"), "/var/ZEM_Support\n/var/ZEM_Support\n/var/ZEM_Support\n");
-  const std::string trace = Trace();
-  EXPECT_THAT(trace, HasSubstr("AcquireUpdate: command = mkdir"));
+TEST(Packages, StepsRecreateMissingDirectories) {
+  const Installation machine;
+  machine.InstallCopyScript();
+  machine.Install("tavtool",
+                  "ls -d /var/ZEM_Support /tmp/tav >>../seen\n"
+                  "case $1 in acquire) rm -r /var/ZEM_Support ;;\n"
+                  "comparelocal) mv /tmp/tav /tmp/expanded; rm -r /var/ZEM_Support; exit 21 ;;\n"
+                  "expand) mv /tmp/expanded/* /tmp/tav ;; esac");
+  EXPECT_THAT(machine.Run({"--update"}).out, EndsWith("Done\nDone\n"));
+  const std::string both = "/tmp/tav\n/var/ZEM_Support\n";
+  EXPECT_EQ(ReadFile(machine.Directory() + "/seen"), "/tmp/tav\n" + both + both + both);
+  // Only the download's mkdir is traced.
+  const std::string trace = machine.Trace();
   EXPECT_EQ(trace.find("mkdir"), trace.rfind("mkdir"));
-  EXPECT_THAT(ReadFile(Directory() + "/stdout.acquire"), ::testing::EndsWith("please wait...\n"));
-  EXPECT_THAT(ReadFile(Directory() + "/stdout.expand"),
-              ::testing::EndsWith("downloading...Applying update(s) please wait..."));
 }
 
-TEST_F(Packages, VersionHandedToTheCopyScript) {
-  fs::create_directory(kRepository);
-  InstallCopyScript();
+TEST(Packages, TheUserSeesTheStepBeforeItsCommandRuns) {
+  const Installation machine;
+  machine.InstallCopyScript();
+  machine.Install("tavtool", "cp ../stdout ../stdout.$1; [ $1 != comparelocal ] || exit 21");
+  machine.Run({"--update"});
+  EXPECT_THAT(ReadFile(machine.Directory() + "/stdout.compareweb"), EndsWith("please wait...\n"));
+  EXPECT_THAT(ReadFile(machine.Directory() + "/stdout.expand"), EndsWith("Applying update(s) please wait..."));
+}
+
+TEST(Packages, PassTheVersionToTheCopyScript) {
   const std::pair<std::string, std::string> rows[] = {
-      {"Name=pack\nVersion=2.31a\nVersion=9.99\n", "[2.31]"},
-      {"Version=9\n", "[9]"},
+      {"Name=pack\nVersion=2.31a\nVersion=9.99\n", "2.31"},
+      {"\nVersion=9\n", "9"},
       {"Version=\nVersion=1.23\n", ""},
-      {"PackageVersion=1.05", "[1.05]"},
-      {"VersioVersion=3.00 Version=4", "[3.00]"},
+      {"PackageVersion=1.05", "1.05"},
+      {"VersioVersion=3.00 Version=4", "3.00"},
       {"Version =1\nversion=2\nVersion\n=3", ""},
-      {std::string(70000, 'V') + "ersion=1.2\n", "[1.2]"},
-      {"Version=1 23", "[1][23]"},
+      {std::string(70000, 'V') + "ersion=1.2\n", "1.2"},
+      {"Version=1 23", "1 23"},
       {"", ""},
   };
-  for (const auto& [output, arguments] : rows) {
+  const Installation machine;
+  machine.CreateRepository();
+  machine.InstallCopyScript();
+  machine.Install("tavtool", "[ \"$1\" != comparelocal ] || { cat \"$0.output\"; exit 21; }");
+  for (const auto& [output, version] : rows) {
     SCOPED_TRACE(output.substr(0, 60));
-    WriteFile(Directory() + "/output", output);
-    Install("tavtool", "[ \"$1\" != comparelocal ] || { cat '" + Directory() + "/output'; exit 21; }");
-    fs::remove(Directory() + "/calls.copy.sh");
-    Run({});
-    EXPECT_THAT(CallsOf("copy.sh"), ElementsAre("[/tmp/tav][@][/var/ZEM_Support]" + arguments));
+    WriteFile(machine.Directory() + "/tavtool.output", output);
+    machine.Run();
+    EXPECT_EQ(machine.TraceLines("[Status:]CopyTAVToRUVFoler: command = ").back(),
+              "\"/tmp/tav/ruv/data/copy.sh\" \"/tmp/tav\" \"@\" \"/var/ZEM_Support\" " + version +
+                  " 1>>/var/log/ZEM_Support/ruvtav.log 2>&1");
   }
-  const Strings commands = TraceLines("[Status:]CopyTAVToRUVFoler: command = ");
-  EXPECT_EQ(commands.back(),
-            "\"/tmp/tav/ruv/data/copy.sh\" \"/tmp/tav\" \"@\" \"/var/ZEM_Support\"  "
-            "1>>/var/log/ZEM_Support/ruvtav.log 2>&1");
 }
 
-TEST_F(Packages, ExpansionAndInstallation) {
-  const std::string start =
-      "Discovered RUV update(s) in local drive for this system.\nApplying update(s) please wait...";
+TEST(Packages, InstallIfExpansionSucceedsAndThereIsACopyScript) {
+  const std::string done = "Done\n";
   const std::string missing = "[Status:]CopyTAVToRUVFoler: script file \"/tmp/tav/ruv/data/copy.sh\" does not exist!";
   const std::string failed = "[Status:]DecompressTAV: Failed to copy TAV to RUV Folder!";
   const std::string success = "[Status:]DecompressTAV: Copy TAV to RUV Folder Successfully!";
-  enum Script { kNone, kFile, kFailing, kDirectory };
+  enum class Script { kNone, kFile, kFailing, kDirectory };
   struct Row {
-    std::string what;
-    int exit_code;
+    int exit_code;  // of the expansion
     Script script;
     std::string out;
     Strings copy_calls;
     Strings traced;
-    bool listed;
   };
   const Row rows[] = {
-      {"no payload", 52, kFile, "Done\n", {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}, true},
-      {"no payload", 61, kFile, "Done\n", {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}, true},
-      {"success", 32, kFailing, "Done\n", {"[/tmp/tav][@][/var/ZEM_Support]"}, {success}, true},
-      {"no script", 0, kNone, "Failed\n", {}, {missing, failed}, false},
-      {"directory", 52, kDirectory, "Failed\n", {}, {missing, failed}, false},
-      {"silent failure", 21, kFile, "", {}, {}, false},
-      {"failure", 1, kFile, "Invalid command parameter specified.\n", {}, {}, false},
+      {52, Script::kFile, done, {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}},
+      {61, Script::kFile, done, {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}},
+      {32, Script::kFailing, done, {"[/tmp/tav][@][/var/ZEM_Support]"}, {success}},
+      {0, Script::kNone, "Failed\n", {}, {missing, failed}},
+      {52, Script::kDirectory, "Failed\n", {}, {missing, failed}},
+      {21, Script::kFile, "", {}, {}},
+      {1, Script::kFile, "Invalid command parameter specified.\n", {}, {}},
   };
   for (const Row& row : rows) {
-    SCOPED_TRACE(row.what);
-    TearDown();
-    SetUp();
-    fs::create_directory(kRepository);
-    InstallTool({{"comparelocal", 21}, {"expand", row.exit_code}});
-    if (row.script == kFile) InstallCopyScript();
-    if (row.script == kFailing) InstallCopyScript("exit 3");
-    if (row.script == kDirectory) fs::create_directories("/tmp/tav/ruv/data/copy.sh");
-    EXPECT_EQ(Run({}).out, start + row.out);
-    EXPECT_EQ(CallsOf("copy.sh"), row.copy_calls);
+    SCOPED_TRACE(row.exit_code);
+    const Installation machine;
+    machine.CreateRepository();
+    machine.InstallTool({{"comparelocal", 21}, {"expand", row.exit_code}});
+    if (row.script == Script::kFile) machine.InstallCopyScript();
+    if (row.script == Script::kFailing) machine.InstallCopyScript("exit 3");
+    if (row.script == Script::kDirectory) fs::create_directories("/tmp/tav/ruv/data/copy.sh");
+    EXPECT_EQ(machine.Run().out,
+              "Discovered RUV update(s) in local drive for this system.\nApplying update(s) please wait..." + row.out);
+    EXPECT_EQ(machine.CallsOf("copy.sh"), row.copy_calls);
+    Strings traced;
     for (const std::string& line : {missing, failed, success}) {
-      const bool expected = std::find(row.traced.begin(), row.traced.end(), line) != row.traced.end();
-      EXPECT_EQ(TraceLines(line).size(), expected ? 1U : 0U) << line;
+      if (!machine.TraceLines(line).empty()) traced.push_back(line);
     }
-    EXPECT_EQ(ReadFile(Directory() + "/data/supportlist.xml") != "<MT>1234</MT>\n", row.listed);
-    EXPECT_TRUE(fs::is_directory(kExpansionDirectory));
-    EXPECT_THAT(CallsOf("ruv"), ElementsAre(""));
+    EXPECT_EQ(traced, row.traced);
+    EXPECT_EQ(ReadFile(machine.SupportListFile()),
+              row.out == done ? "<MT>1234</MT>\n\n<MT>1234</MT>" : "<MT>1234</MT>\n");
+    EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre(""));
   }
 }
 
-TEST_F(Packages, PortableMedia) {
-  const std::string media = Directory() + "/portable media";
-  const RunOptions portable = Environment("ZEM_PORTABLE_EXEC_DIR", media);
+TEST(Packages, AreImportedFromPortableMedia) {
+  const Installation machine;
+  const std::string media = machine.Directory() + "/portable media";
   const std::string member = "[Status:]CopyPortableTAVToRepository: ";
-
-  // No update folder: nothing is imported, and without a repository nothing is compared.
-  Run({}, portable);
-  EXPECT_THAT(TraceLines(member), ElementsAre("The directory <Portable>/update does not Exist!"));
-  EXPECT_THAT(CallsOf("tavtool"), IsEmpty());
+  const std::string command =
+      "TAVToolCmd = \"@/tavtool\" copy -l \"@/portable media/update\" -t \"/var/ZEM_Support\" -m 1234 -o rhel5 -a 64 "
+      "1>/dev/null 2>&1";
+  const auto run = [&] {
+    fs::remove(kTraceFile);
+    return machine.Run({"-v"}, Environment("ZEM_PORTABLE_EXEC_DIR", media)).out;
+  };
+  run();
+  EXPECT_THAT(machine.TraceLines(member), ElementsAre("The directory <Portable>/update does not Exist!"));
+  EXPECT_THAT(machine.ToolVerbs(), IsEmpty());
   EXPECT_FALSE(fs::exists(kRepository));
 
-  fs::remove(kTraceFile);
   fs::create_directories(media + "/update");
-  InstallTool({{"copy", 51}});
-  EXPECT_THAT(Run({}, portable).out, HasSubstr("package corrupted"));
-  const std::string command =
-      "TAVToolCmd = \"@/tavtool\" copy -l \"@/portable media/update\" -t \"/var/ZEM_Support\" -m 1234 -o "
-      "rhel5 -a 64 "
-      "1>/dev/null 2>&1";
-  EXPECT_THAT(TraceLines(member), ElementsAre("command = mkdir -p /var/ZEM_Support 1>/dev/null 2>&1", command));
-  EXPECT_THAT(CallsOf("tavtool"),
+  machine.InstallTool({{"copy", 51}});
+  EXPECT_THAT(run(), HasSubstr("package corrupted"));
+  EXPECT_THAT(machine.TraceLines(member), ElementsAre("command = mkdir -p /var/ZEM_Support 1>/dev/null 2>&1", command));
+  EXPECT_THAT(machine.CallsOf("tavtool"),
               ElementsAre("[copy][-l][@/portable media/update][-t][/var/ZEM_Support][-m][1234][-o][rhel5][-a][64]",
                           "[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]"));
+  run();
+  EXPECT_THAT(machine.TraceLines(member), ElementsAre(command)) << "the repository exists now";
+}
 
-  // The repository is there now; forwarded arguments are not the copy's business.
-  fs::remove(kTraceFile);
-  Run({"-v"}, portable);
-  EXPECT_THAT(TraceLines(member), ElementsAre(command));
-
-  // A download goes to the media, whatever the blank in its path did to the bare mkdir.
-  fs::remove(kTraceFile);
-  fs::remove(media + "/update");
-  Run({"--update"}, portable);
-  EXPECT_THAT(TraceLines("[Status:]AcquireUpdate: command = "),
-              ElementsAre("mkdir -p @/portable media/update 1>/dev/null 2>&1"));
-  EXPECT_THAT(CallsOf("tavtool").back(),
-              "[acquire][-l][@/portable media/update][-m][1234][-o][rhel5][-a][64][--force][--latest]");
+TEST(Packages, AreDownloadedToPortableMedia) {
+  const Installation machine;
+  machine.Run({"--update"}, Environment("ZEM_PORTABLE_EXEC_DIR", machine.Directory() + "/portable media"));
+  EXPECT_THAT(machine.TraceLines("[Status:]AcquireUpdate: command = "),
+              ElementsAre("mkdir -p @/portable media/update 1>/dev/null 2>&1"));  // a bare path, blank or not
+  EXPECT_EQ(machine.CallsOf("tavtool").back(),
+            "[acquire][-l][@/portable media/update][-m][1234][-o][rhel5][-a][64][--force][--latest]");
 }

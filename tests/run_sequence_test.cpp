@@ -1,41 +1,40 @@
-// Which steps a run takes, in which order, and what the user and the trace see of them.
+// Whole runs: which steps follow which, and how a run reacts to signals, limits and closed streams.
 #include <filesystem>
 
-#include "launcher_fixture.h"
+#include "installation.h"
 
 using ::testing::ElementsAre;
+using ::testing::EndsWith;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
-using ::testing::Not;
 using ::testing::SizeIs;
 
 namespace fs = std::filesystem;
 
-class RunSequence : public LauncherTest {};
+// The whole trace of one run.
+TEST(RunSequence, InstallsAPackageFromTheRepositoryAndStartsTheApplication) {
+  const Installation machine;
+  machine.CreateRepository();
+  machine.MakeUnsupported();
+  machine.InstallTool({{"comparelocal", 21}}, "Name=pack\nVersion=2.31a\n");
+  machine.InstallCopyScript("echo copied; echo oops >&2");
+  machine.Install("ruv", "echo application; echo hidden >&2; exit 9");
 
-// The whole trace of one run: what the user's example looks like from start to end.
-TEST_F(RunSequence, LaunchInstallsAPackageFromTheRepositoryAndStartsTheApplication) {
-  fs::create_directory(kRepository);
-  WriteFile(Directory() + "/data/supportlist.xml", "<MT>9999</MT>\n");
-  InstallTool({{"comparelocal", 21}}, "Name=pack\nVersion=2.31a\n");
-  InstallCopyScript("echo copied; echo oops >&2");
-  Install("ruv", "echo application; echo hidden >&2; exit 9");
-
-  const RunResult run = Run({"-v"});
+  const RunResult run = machine.Run({"-v"});
 
   EXPECT_EQ(run.status, 0);
   EXPECT_EQ(run.out,
             "Discovered RUV update(s) in local drive for this system.\n"
             "Applying update(s) please wait...Done\n"
             "application\n");
-  EXPECT_THAT(CallsOf("tavtool"),
+  EXPECT_THAT(machine.CallsOf("tavtool"),
               ElementsAre("[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]",
                           "[expand][-l][/var/ZEM_Support][-t][/tmp/tav][-m][1234][-o][rhel5][-a][64]"));
-  EXPECT_THAT(CallsOf("copy.sh"), ElementsAre("[/tmp/tav][@][/var/ZEM_Support][2.31]"));
-  EXPECT_THAT(CallsOf("ruv"), ElementsAre("[-v]"));
-  EXPECT_EQ(ReadFile(Directory() + "/data/supportlist.xml"), "<MT>9999</MT>\n\n<MT>1234</MT>");
+  EXPECT_THAT(machine.CallsOf("copy.sh"), ElementsAre("[/tmp/tav][@][/var/ZEM_Support][2.31]"));
+  EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre("[-v]"));
+  EXPECT_EQ(ReadFile(machine.SupportListFile()), "<MT>9999</MT>\n\n<MT>1234</MT>");
   EXPECT_EQ(fs::status("/tmp/tav/ruv/data/copy.sh").permissions(), fs::perms::all);
-  EXPECT_EQ(Trace(), R"trace([TAVRUV]: [Debug:] Enter: TAVMaster::TAVMaster()
+  EXPECT_EQ(machine.Trace(), R"trace([TAVRUV]: [Debug:] Enter: TAVMaster::TAVMaster()
 [TAVRUV]: [Debug:] Entering TAVMaster::GetTAVBinaryPath()
 [TAVRUV]: [Debug:] Exiting TAVMaster::GetTAVBinaryPath()
 [TAVRUV]: [Status:]TAVMaster: command = @/guihelper.sh 1>/dev/null 2>&1
@@ -77,97 +76,83 @@ oops
 )trace");
 }
 
-// One row: a command line, what the tool answers, and which steps follow.
-TEST_F(RunSequence, UpdateModeStopsWhereAStepFailsAndNeverStartsTheApplication) {
+TEST(RunSequence, UpdateModeStopsAtAFailedStepAndNeverStartsTheApplication) {
   struct Row {
-    std::string what;
     std::string option;
-    bool portable;
-    std::map<std::string, int> tool;
-    std::string out;  // behind the first line, which all rows share
+    std::map<std::string, int> tool;  // exit codes of its verbs
+    std::string out;                  // after the first line
     Strings verbs;
-    bool listed;  // the machine type was appended to the support list
+    std::string appended;  // to the support list
   };
   const std::string detected = "RUV update(s) detected, start downloading...";
   const std::string there = "There's new update for this system, use --update to download\n";
   const std::string latest = "You already have the latest version RUV.\n";
   const std::string no_kro = detected + "Couldn't ping KRO, maybe the KRO is down.\nFailed\n";
   const std::string applying = detected + "Applying update(s) please wait...";
-  const std::string corrupted = applying +
-                                "Error, package corrupted or not enough free space on disk.\n"
-                                "Ensure that there is enough system disk space and have written permissions.\nDone\n";
+  const std::string invalid = applying + "Invalid command parameter specified.\nDone\n";
   const Strings check = {"compareweb"};
   const Strings download = {"compareweb", "acquire"};
   const Strings compare = {"compareweb", "acquire", "comparelocal"};
   const Strings all = {"compareweb", "acquire", "comparelocal", "expand"};
   const Row rows[] = {
-      {"check, update there", "--chkupd", false, {}, there, check, false},
-      {"check, none", "--chkupd", false, {{"compareweb", 30}}, latest, check, false},
-      {"check, package result", "--CHKUPD", false, {{"compareweb", 21}}, "", check, false},
-      {"update, none", "--update", false, {{"compareweb", 2}}, "", check, false},
-      {"download fails", "--update", false, {{"acquire", 77}}, detected + "Failed\n", download, false},
-      {"download fails, with a message", "--update", false, {{"acquire", 45}}, no_kro, download, false},
-      {"nothing newer", "--update", false, {{"compareweb", 32}, {"acquire", 32}}, detected + "Done\n", compare, false},
-      {"latest", "--update", false, {{"comparelocal", 30}}, detected + latest + "Done\n", compare, false},
-      {"no payload", "--update", false, {{"comparelocal", 52}}, detected + "Done\n", compare, false},
-      {"installed", "--Update", false, {{"comparelocal", 21}}, applying + "Done\nDone\n", all, true},
-      {"expansion fails", "--update", false, {{"comparelocal", 21}, {"expand", 51}}, corrupted, all, false},
-      {"portable", "--update", true, {{"comparelocal", 21}}, detected + "Done\n", download, false},
+      {"--chkupd", {}, there, check, ""},
+      {"--chkupd", {{"compareweb", 30}}, latest, check, ""},
+      {"--CHKUPD", {{"compareweb", 21}}, "", check, ""},
+      {"--update", {{"compareweb", 2}}, "", check, ""},
+      {"--update", {{"acquire", 77}}, detected + "Failed\n", download, ""},
+      {"--update", {{"acquire", 45}}, no_kro, download, ""},
+      {"--update", {{"compareweb", 32}, {"acquire", 32}}, detected + "Done\n", compare, ""},
+      {"--update", {{"comparelocal", 30}}, detected + latest + "Done\n", compare, ""},
+      {"--update", {{"comparelocal", 52}}, detected + "Done\n", compare, ""},
+      {"--Update", {{"comparelocal", 21}}, applying + "Done\nDone\n", all, "\n<MT>1234</MT>"},
+      {"--update", {{"comparelocal", 21}, {"expand", 1}}, invalid, all, ""},
   };
   for (const Row& row : rows) {
-    SCOPED_TRACE(row.what);
-    TearDown();
-    SetUp();
-    InstallTool(row.tool);
-    InstallCopyScript();
-    RunOptions options;
-    if (row.portable) options.environment["ZEM_PORTABLE_EXEC_DIR"] = Directory() + "/media";
-
-    const RunResult run = Run({row.option}, options);
-
+    SCOPED_TRACE(row.option + " " + ::testing::PrintToString(row.tool));
+    const Installation machine;
+    machine.InstallTool(row.tool);
+    machine.InstallCopyScript();
+    const RunResult run = machine.Run({row.option});
     EXPECT_EQ(run.status, 0);
     EXPECT_EQ(run.out, "Detecting available update on internet, please wait...\n" + row.out);
-    Strings verbs;
-    for (const std::string& call : CallsOf("tavtool")) verbs.push_back(call.substr(1, call.find(']') - 1));
-    EXPECT_EQ(verbs, row.verbs);
-    EXPECT_THAT(CallsOf("ruv"), IsEmpty());
-    EXPECT_EQ(ReadFile(Directory() + "/data/supportlist.xml") == "<MT>1234</MT>\n\n<MT>1234</MT>", row.listed);
-    EXPECT_THAT(Trace(), HasSubstr("[Debug:] Exiting TAVMaster::TAVMasterMain()\n"
-                                   "[TAVRUV]: [Debug:] Entering TAVMaster::~TAVMaster()\n"
-                                   "[TAVRUV]: [Debug:] Exiting TAVMaster::~TAVMaster()\n"));
+    EXPECT_EQ(machine.ToolVerbs(), row.verbs);
+    EXPECT_THAT(machine.CallsOf("ruv"), IsEmpty());
+    EXPECT_EQ(ReadFile(machine.SupportListFile()), "<MT>1234</MT>\n" + row.appended);
+    EXPECT_THAT(machine.Trace(), EndsWith("[Debug:] Exiting TAVMaster::TAVMasterMain()\n"
+                                          "[TAVRUV]: [Debug:] Entering TAVMaster::~TAVMaster()\n"
+                                          "[TAVRUV]: [Debug:] Exiting TAVMaster::~TAVMaster()\n"));
   }
 }
 
-TEST_F(RunSequence, LaunchModeLooksForPackagesOnlyWhereItMay) {
-  struct Row {
-    std::string what;
-    Strings arguments;
-    bool repository;
-    Strings verbs;
+TEST(RunSequence, PortableUpdateEndsAfterTheDownload) {
+  const Installation machine;
+  machine.InstallTool({{"comparelocal", 21}});
+  EXPECT_THAT(machine.Run({"--update"}, Environment("ZEM_PORTABLE_EXEC_DIR", machine.Directory())).out,
+              EndsWith("RUV update(s) detected, start downloading...Done\n"));
+  EXPECT_THAT(machine.ToolVerbs(), ElementsAre("compareweb", "acquire"));
+}
+
+TEST(RunSequence, LaunchModeComparesIfThereIsARepository) {
+  const std::pair<Strings, Strings> rows[] = {
+      {{}, {"comparelocal"}},
+      {{"--VMware-ESXi", "host"}, {}},
+      {{"--ipmi-lan"}, {}},
   };
-  const Row rows[] = {
-      {"no repository", {}, false, {}},
-      {"repository", {}, true, {"comparelocal"}},
-      {"packages ignored", {"--VMware-ESXi", "host"}, true, {}},
-      {"packages ignored, other option", {"--ipmi-lan"}, true, {}},
-  };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(row.what);
-    TearDown();
-    SetUp();
-    if (row.repository) fs::create_directory(kRepository);
-    InstallTool({{"comparelocal", 52}});  // no payload is nothing to install here
-    const RunResult run = Run(row.arguments);
-    EXPECT_EQ(run.out, "");
-    Strings verbs;
-    for (const std::string& call : CallsOf("tavtool")) verbs.push_back(call.substr(1, call.find(']') - 1));
-    EXPECT_EQ(verbs, row.verbs);
-    EXPECT_THAT(CallsOf("ruv"), SizeIs(1));
-    EXPECT_EQ(fs::exists(kRepository), row.repository);
+  for (const auto& [arguments, verbs] : rows) {
+    const Installation machine;
+    machine.Run(arguments);
+    EXPECT_THAT(machine.ToolVerbs(), IsEmpty());
+    EXPECT_FALSE(fs::exists(kRepository));
+    machine.CreateRepository();
+    machine.InstallTool({{"comparelocal", 52}});  // no payload: nothing to install
+    EXPECT_EQ(machine.Run(arguments).out, "");
+    EXPECT_EQ(machine.ToolVerbs(), verbs);
+    EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(2));
   }
 }
 
-TEST_F(RunSequence, SearchPathsAreExtendedForEveryProgram) {
+TEST(RunSequence, ExtendsTheSearchPathsForEveryProgram) {
+  if (IsInstrumented()) GTEST_SKIP() << "valgrind extends LD_LIBRARY_PATH itself";
   const std::string libraries = "./:./qlogic/qcccli/:./qlogic/:./fibre/:./megalsi:./mellanox:./nvidia";
   struct Row {
     std::optional<std::string> library_path;
@@ -179,62 +164,117 @@ TEST_F(RunSequence, SearchPathsAreExtendedForEveryProgram) {
       {"", ":" + libraries, "/bin:./mellanox"},
       {"/usr/lib", "/usr/lib:" + libraries, "/usr/bin:/bin"},
   };
+  const Installation machine;
   for (const char* program : {"ruv", "guihelper.sh"}) {
-    Install(program, "echo \"$LD_LIBRARY_PATH|$PATH\" >'" + Directory() + "/environment." + program + "'");
+    machine.Install(program, "echo \"$LD_LIBRARY_PATH|$PATH\" >\"$0.environment\"");
   }
   for (const Row& row : rows) {
     RunOptions options = Environment("LD_LIBRARY_PATH", row.library_path);
     options.environment["PATH"] = row.path;
-    Run({}, options);
+    machine.Run({}, options);
     const std::string expected = row.library_path_after + "|" + row.path + ":./mellanox\n";
-    EXPECT_EQ(ReadFile(Directory() + "/environment.ruv"), expected);
-    EXPECT_EQ(ReadFile(Directory() + "/environment.guihelper.sh"), expected);
+    EXPECT_EQ(ReadFile(machine.Directory() + "/ruv.environment"), expected);
+    EXPECT_EQ(ReadFile(machine.Directory() + "/guihelper.sh.environment"), expected);
   }
-  // Without PATH the shells below find nothing by name: the application leaves its environment as the kernel shows it.
-  Install("ruv", "/bin/cat /proc/self/environ >'" + Directory() + "/environment.ruv'");
-  Run({}, Environment("PATH", std::nullopt));
-  EXPECT_THAT(ReadFile(Directory() + "/environment.ruv"), HasSubstr(std::string("\0PATH=./mellanox\0", 17)));
+  // Shells have a PATH of their own if there is none: the application reads its environment as the kernel shows it.
+  machine.Install("ruv", "/bin/cat /proc/self/environ >\"$0.environment\"");
+  machine.Run({}, Environment("PATH", std::nullopt));
+  EXPECT_THAT(ReadFile(machine.Directory() + "/ruv.environment"), HasSubstr(std::string("\0PATH=./mellanox\0", 17)));
 }
 
-TEST_F(RunSequence, AnInterruptedToolEndsTheRunAtOnce) {
+TEST(RunSequence, GivesTheApplicationTheNewSupportListAndNoOpenFiles) {
+  const Installation machine;
+  machine.CreateRepository();
+  machine.InstallTool({{"comparelocal", 21}}, "Version=1.00");
+  machine.InstallCopyScript();
+  machine.Install("guihelper.sh", "cd /proc/$$/fd; echo * >\"$0.files\"");
+  machine.Install("ruv", "cat \"${0%/*}/data/supportlist.xml\"; cd /proc/$$/fd; echo * >\"$0.files\"");
+  EXPECT_THAT(machine.Run().out, EndsWith("Done\n<MT>1234</MT>\n\n<MT>1234</MT>"));
+  EXPECT_EQ(ReadFile(machine.Directory() + "/ruv.files"), ReadFile(machine.Directory() + "/guihelper.sh.files"));
+}
+
+TEST(RunSequence, EndsAtOnceIfTheToolIsInterrupted) {
   for (const char* option : {"--update", "-v"}) {
     SCOPED_TRACE(option);
-    TearDown();
-    SetUp();
-    fs::create_directory(kRepository);
-    // As Ctrl-C does it: the whole foreground process group gets the signal, here one of the launcher's own.
-    Install("tavtool", "kill -INT 0; sleep 1");
-    const RunResult run = Run({option}, Prelude("set -- setsid --wait \"$@\""));
+    const Installation machine;
+    machine.CreateRepository();
+    // Like Ctrl-C: signals the whole foreground process group, here one of the launcher's own.
+    machine.Install("tavtool", "kill -INT 0; sleep 1");
+    const RunResult run = machine.Run({option}, Prelude("set -- setsid --wait \"$@\""));
     EXPECT_EQ(run.status, 1);
-    EXPECT_THAT(run.out, ::testing::EndsWith("RUV application is determined by the user!\n"));
-    EXPECT_THAT(Trace(), ::testing::EndsWith(" 2>&1\n"));
-    EXPECT_THAT(CallsOf("tavtool"), SizeIs(1));
-    EXPECT_THAT(CallsOf("ruv"), IsEmpty());
+    EXPECT_THAT(run.out, EndsWith("RUV application is determined by the user!\n"));
+    EXPECT_THAT(machine.Trace(), EndsWith(" 2>&1\n"));
+    EXPECT_THAT(machine.CallsOf("tavtool"), SizeIs(1));
+    EXPECT_THAT(machine.CallsOf("ruv"), IsEmpty());
   }
 }
 
-TEST_F(RunSequence, WhatTheParentLeftOrTheConsoleDoesIsNoFailure) {
-  fs::create_directory(kRepository);
-  InstallTool({{"comparelocal", 30}});
-  // SIGCHLD ignored: exit codes still arrive, here as a message.
-  EXPECT_EQ(Run({}, Prelude("set -- env --ignore-signal=CHLD \"$@\"")).out,
+TEST(RunSequence, GetsExitCodesAlthoughItsParentIgnoresSigchld) {
+  const Installation machine;
+  machine.CreateRepository();
+  machine.InstallTool({{"comparelocal", 30}});
+  EXPECT_EQ(machine.Run({}, Prelude("set -- env --ignore-signal=CHLD \"$@\"")).out,
             "You already have the latest version RUV.\n");
-  // A console that nobody reads: the message is lost, the run is not, and the application dies of SIGPIPE as usual.
-  Install("ruv", "kill -PIPE $$; echo ignored >'" + Directory() + "/survived'");
-  EXPECT_EQ(Run({}, Prelude("mkfifo pipe; sleep 0.2 <pipe & exec >pipe; wait")).status, 0);
-  EXPECT_EQ(ReadFile(Directory() + "/survived"), "");
-  // A parent that ignores SIGPIPE wants that for all.
-  Install("ruv", "sed -n 's/^SigIgn:.*\\(....\\)$/\\1/p' /proc/$$/status >'" + Directory() + "/ignored'");
-  Run({}, Prelude("trap '' PIPE"));
-  EXPECT_EQ(ReadFile(Directory() + "/ignored"), "1000\n");
-  Run({});
-  EXPECT_EQ(ReadFile(Directory() + "/ignored"), "0000\n");
-  // Without standard output a file that is opened gets its descriptor. Then without any stream at all.
-  Install("ruv");
-  fs::remove(Directory() + "/calls.ruv");
-  for (const char* closed : {"exec >&-", "exec <&- >&- 2>&-"}) EXPECT_EQ(Run({"-x"}, Prelude(closed)).status, 0);
-  EXPECT_THAT(CallsOf("ruv"), ElementsAre("[-x]", "[-x]"));
-  EXPECT_THAT(Trace(), Not(HasSubstr("You already have the latest version RUV.\n[TAVRUV]: You")));
 }
 
-TEST_F(RunSequence, AFileSizeLimitEndsNothing) { EXPECT_EQ(Run({}, Prelude("ulimit -f 0")).status, 0); }
+TEST(RunSequence, SurvivesAConsoleThatNobodyReads) {
+  const Installation machine;
+  machine.CreateRepository();
+  machine.InstallTool({{"comparelocal", 30}});
+  EXPECT_EQ(machine.Run({}, Prelude("mkfifo pipe; sleep 0.2 <pipe & exec >pipe; wait")).status, 0);
+  EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(1));
+}
+
+TEST(RunSequence, ProgramsDieOfSigpipeUnlessItsParentIgnoresIt) {
+  const Installation machine;
+  machine.Install("ruv", "kill -PIPE $$; echo survived");
+  EXPECT_EQ(machine.Run().out, "");
+  EXPECT_EQ(machine.Run({}, Prelude("trap '' PIPE")).out, "survived\n");
+}
+
+// Without standard output, a file that is opened gets its descriptor.
+TEST(RunSequence, RunsWithoutStandardStreams) {
+  const Installation machine;
+  machine.CreateRepository();
+  machine.InstallTool({{"comparelocal", 30}});
+  for (const char* closed : {"exec >&-", "exec <&- >&- 2>&-"})
+    EXPECT_EQ(machine.Run({"-x"}, Prelude(closed)).status, 0);
+  EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre("[-x]", "[-x]"));
+  EXPECT_THAT(machine.TraceLines("You already"), SizeIs(2)) << "console text in the trace";
+}
+
+TEST(RunSequence, SurvivesAFileSizeLimit) {
+  if (IsInstrumented()) GTEST_SKIP() << "valgrind writes files of its own";
+  const Installation machine;
+  EXPECT_EQ(machine.Run({}, Prelude("ulimit -f 0")).status, 0);
+}
+
+// Runs the launcher with less and less memory until the dynamic loader cannot start it. Counts the runs that ended with
+// status 1 for lack of memory, by the last lines of their traces.
+std::map<std::string, int> RunsOutOfMemory(const Strings& arguments, int bytes, int steps) {
+  const Installation machine;
+  std::map<std::string, int> runs;
+  RunResult run = {0, ""};
+  machine.Install("ruv", "echo started");
+  for (; run.status <= 1; bytes -= bytes / (run.out == "started\n" ? 16 : steps)) {
+    fs::remove(kTraceFile);
+    run = machine.Run(arguments, Prelude("set -- prlimit --as=" + std::to_string(bytes) + " \"$@\""));
+    if (run.status != 1) continue;
+    EXPECT_THAT(run.out, EndsWith("ERROR: Not enough memory, RUV launcher ends.\n"));
+    const Strings lines = machine.TraceLines("");
+    ++runs[lines.empty() ? "" : lines.back()];
+  }
+  EXPECT_EQ(run.status, 127) << run.out;
+  return runs;
+}
+
+TEST(RunSequence, EndsWithOneLineIfMemoryRunsOutBeforeMain) {
+  if (IsInstrumented()) GTEST_SKIP() << "needs more memory than the launcher";
+  EXPECT_GT(RunsOutOfMemory({}, 5 << 20, 128)[""], 0);
+}
+
+TEST(RunSequence, DestroysTheSessionIfMemoryRunsOut) {
+  if (IsInstrumented()) GTEST_SKIP() << "needs more memory than the launcher";
+  const Strings arguments(12, "-" + std::string(100'000, 'x'));
+  EXPECT_GT(RunsOutOfMemory(arguments, 12 << 20, 16)["[Debug:] Exiting TAVMaster::~TAVMaster()"], 0);
+}

@@ -1,32 +1,22 @@
-// The list of supported machine types: what is read as an entry, and what an installation appends.
+// The list of supported machine types: what counts as an entry, and what an installation appends.
 #include <filesystem>
 
-#include "launcher_fixture.h"
+#include "installation.h"
 
+using ::testing::EndsWith;
 using ::testing::HasSubstr;
-using ::testing::Not;
+using ::testing::StartsWith;
 
 namespace fs = std::filesystem;
 
-class SupportList : public LauncherTest {
- protected:
-  std::string List() const { return Directory() + "/data/supportlist.xml"; }
-
-  // Whether a run on a machine of this type starts the application without a warning.
-  bool Supported(const std::string& machine_type) {
-    WriteFile(kSystemInformationFile, "ZEM_SYSTEM_MT=" + machine_type + "\n");
-    return Run({"-b"}).out.find("You might need") == std::string::npos;
-  }
-};
-
-TEST_F(SupportList, Entries) {
+TEST(SupportList, ReadsTheFourCharactersAfterATag) {
   struct Row {
     std::string text;
     Strings supported;
     Strings unsupported;
   };
   const Row rows[] = {
-      {"<?xml?>\r\n<MT>1234</MT>\r\n<MT>1234</MT>\n<x><MT>\n", {"1234", "MT>"}, {"5678", "123", "12345", "1234\r"}},
+      {"<?xml?>\r\n\n\n<MT>1234</MT>\r\n<MT>1234</MT>\n<x><MT>\n", {"1234", "MT>"}, {"5678", "123", "12345", "1234\r"}},
       {"<MT>12</MT>", {"12</"}, {"12"}},
       {"<MT>12345</MT>\n<MT>7", {"1234", "7"}, {"12345", "2345"}},
       {"  <MT>1234</MT>\n", {"T>12"}, {"1234"}},
@@ -35,45 +25,45 @@ TEST_F(SupportList, Entries) {
       {"", {}, {"1234", ""}},
       {"<MT>", {""}, {"1234"}},
   };
+  const Installation machine;
+  const auto warning_for = [&](const std::string& machine_type) {
+    WriteFile(kSystemInformationFile, "ZEM_SYSTEM_MT=" + machine_type + "\n");
+    return machine.Run({"-b"}).out;
+  };
   for (const Row& row : rows) {
     SCOPED_TRACE(row.text);
-    WriteFile(List(), row.text);
-    for (const std::string& machine_type : row.supported) EXPECT_TRUE(Supported(machine_type)) << machine_type;
-    for (const std::string& machine_type : row.unsupported) EXPECT_FALSE(Supported(machine_type)) << machine_type;
+    WriteFile(machine.SupportListFile(), row.text);
+    for (const std::string& type : row.supported) EXPECT_EQ(warning_for(type), "") << type;
+    for (const std::string& type : row.unsupported) EXPECT_THAT(warning_for(type), StartsWith("You might")) << type;
   }
 }
 
-TEST_F(SupportList, AMissingListIsAWarningAndSupportsNothing) {
-  fs::remove(List());
-  EXPECT_THAT(Run({"-b"}).out, ::testing::StartsWith("WARNING:Unable to get system support information!\nYou might"));
+TEST(SupportList, WarnsAboutAMissingListAndSupportsNothing) {
+  const Installation machine;
+  fs::remove(machine.SupportListFile());
+  EXPECT_THAT(machine.Run({"-b"}).out, StartsWith("WARNING:Unable to get system support information!\nYou might"));
 }
 
-TEST_F(SupportList, EveryInstallationAppendsAnEntry) {
-  fs::create_directory(kRepository);
-  InstallTool({{"comparelocal", 21}});
-  InstallCopyScript();
-  const std::string done =
-      "Discovered RUV update(s) in local drive for this system.\nApplying update(s) please wait...Done\n";
-  struct Row {
-    std::string what;
-    std::string before;
-    std::string after;
-  };
-  const Row rows[] = {
-      {"no file", "", "\n<MT>1234</MT>\n<MT>1234</MT>"},
-      {"no final line feed", "<MT>1234</MT>", "<MT>1234</MT>\n<MT>1234</MT>\n<MT>1234</MT>"},
-  };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(row.what);
-    fs::remove(List());
-    if (!row.before.empty()) WriteFile(List(), row.before);
-    for (int run = 0; run < 2; ++run) EXPECT_THAT(Run({}).out, ::testing::EndsWith(done));
-    EXPECT_EQ(ReadFile(List()), row.after);
+TEST(SupportList, GetsAnEntryFromEveryInstallation) {
+  const Installation machine;
+  machine.CreateRepository();
+  machine.InstallTool({{"comparelocal", 21}});
+  machine.InstallCopyScript();
+  for (const std::string before : {"", "<MT>1234</MT>"}) {
+    WriteFile(machine.SupportListFile(), before);
+    for (int run = 0; run < 2; ++run) EXPECT_THAT(machine.Run().out, EndsWith("please wait...Done\n"));
+    EXPECT_EQ(ReadFile(machine.SupportListFile()), before + "\n<MT>1234</MT>\n<MT>1234</MT>");
   }
+}
 
-  // Without the data folder the type counts as supported for this run only, and no folder is made.
-  fs::remove_all(Directory() + "/data");
-  EXPECT_EQ(Run({}).out, "WARNING:Unable to get system support information!\n" + done +
-                             "WARNING:Unable to Update support list, RUV setting restore default.\n");
-  EXPECT_FALSE(fs::exists(Directory() + "/data"));
+TEST(SupportList, IsNotMadeWithoutItsFolder) {
+  const Installation machine;
+  machine.CreateRepository();
+  machine.InstallTool({{"comparelocal", 21}});
+  machine.InstallCopyScript();
+  fs::remove_all(machine.Directory() + "/data");
+  // No question: for this run the machine counts as supported.
+  EXPECT_THAT(machine.Run().out,
+              EndsWith("Done\nWARNING:Unable to Update support list, RUV setting restore default.\n"));
+  EXPECT_FALSE(fs::exists(machine.Directory() + "/data"));
 }

@@ -1,0 +1,54 @@
+// The session's flags and helpers, called directly.
+#include <sys/stat.h>
+
+#include <filesystem>
+
+#include "installation.h"
+#include "launcher/tav.h"
+
+namespace fs = std::filesystem;
+
+TEST(Session, TestsForFilesAndDirectoriesFollowLinks) {
+  const Installation machine;
+  const NZEMRUVTAV::TAVMaster session;
+  const std::string base = machine.Directory() + "/kinds/";
+  WriteFile(base + "file", "");
+  fs::create_symlink("file", base + "link");
+  fs::create_symlink("..", base + "directory link");
+  fs::create_symlink("nowhere", base + "dangling");
+  ASSERT_EQ(mkfifo((base + "pipe").c_str(), 0600), 0);
+  for (const std::string& file : {base + "file", base + "link", base + "pipe", std::string("/dev/null")}) {
+    EXPECT_TRUE(session.FileExist(file) && !session.DirExists(file)) << file;
+  }
+  for (const std::string& directory : {base, base + "directory link"}) {
+    EXPECT_TRUE(session.DirExists(directory) && !session.FileExist(directory)) << directory;
+  }
+  for (const std::string& neither :
+       {base + "dangling", base + "file/below", std::string(), base + std::string(300, 'n')}) {
+    EXPECT_FALSE(session.FileExist(neither) || session.DirExists(neither)) << neither;
+  }
+}
+
+TEST(Session, QuotesAPathAsItIs) {
+  const Installation machine;
+  const NZEMRUVTAV::TAVMaster session;
+  std::string path = "a \"b\"";
+  session.FormatPathString(path);
+  EXPECT_EQ(path, "\"a \"b\"\"");
+  path.clear();
+  session.FormatPathString(path);
+  EXPECT_EQ(path, "\"\"");
+}
+
+TEST(Session, RemembersPrebootOptions) {
+  const Installation machine;
+  char program[] = "launcher", gui[] = "--gui", cmd[] = "--cmd";
+  NZEMRUVTAV::TAVMaster session;
+  EXPECT_FALSE(session.isPrebootGUI() || session.isPrebootCmd());
+  char* with_gui[] = {program, gui};
+  session.ParseParameters(2, with_gui);
+  EXPECT_TRUE(session.isPrebootGUI() && !session.isPrebootCmd());
+  char* with_cmd[] = {program, cmd};
+  session.ParseParameters(2, with_cmd);
+  EXPECT_TRUE(session.isPrebootCmd());
+}
