@@ -123,15 +123,15 @@ TEST(Discovery, FindsTheLaunchersDirectory) {
       {"/launcher", ""},
       {long_directory + "/launcher", long_directory},
   };
-  for (const auto& [argv0, working_path] : rows) {
-    SCOPED_TRACE(argv0);
+  for (const auto& [name, working_path] : rows) {
+    SCOPED_TRACE(name);
     fs::remove(kTraceFile);
-    EXPECT_EQ(machine.Run({"-b"}, StartedAs(argv0)).status, 0);
+    EXPECT_EQ(machine.Run({"-b"}, StartedAs(name)).status, 0);
     const std::string message = ("[Status:]Working Path = " + working_path).substr(0, 511);
     EXPECT_THAT(machine.TraceLines(machine.WithPlainDirectory(message)), ElementsAre(""));
   }
   fs::remove(kTraceFile);
-  machine.Run({}, Prelude("set -- bash -c 'exec -a launcher \"$0\" -b' " + long_directory + "/launcher"));
+  machine.Run({}, Prelude("exec bash -c 'exec -a launcher \"$0\" -b' " + long_directory + "/launcher"));
   EXPECT_THAT(machine.TraceLines("[Status:]Working Path = ").at(0), StartsWith("@/" + long_name + "/" + long_name));
   // Not in the directories of the third and the sixth row.
   EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(6));
@@ -149,25 +149,23 @@ TEST(Discovery, EndsTheRunWithOneLineIfTheDirectoryIsUnknown) {
 TEST(Discovery, FindsTheDirectoryWithoutProcIfThePathIsKnown) {
   if (IsInstrumented() || std::getenv("RUV_SANDBOX") != std::string("namespace")) GTEST_SKIP() << "needs /proc";
   const Installation machine;
-  const std::string without_proc = "set -- unshare --mount sh -c 'mount -t tmpfs none /proc; ";
-  const std::string on_search_path = "exec env PATH=\"" + machine.Directory() + ":$PATH\" launcher -v'";
+  const std::string without_proc = "exec unshare --mount sh -c 'mount -t tmpfs none /proc; ";
+  const std::string on_search_path = "PATH=\"" + machine.Directory() + ":$PATH\"; exec launcher'";
   EXPECT_EQ(machine.Run({}, Prelude(without_proc + on_search_path)).out, "");
   EXPECT_THAT(machine.TraceLines("[Status:]Working Path = "), ElementsAre("@"));
   // An empty element of the search path is the current directory: the kernel, too, gets the bare name.
-  const std::string in_current_directory = "cd ..; exec env PATH= launcher -v'";
+  const std::string in_current_directory = "cd ..; exec env PATH= launcher'";
   EXPECT_THAT(machine.Run({}, Prelude(without_proc + in_current_directory)).out, StartsWith("ERROR: Unable to find"));
 }
 
 TEST(Discovery, TakesThePortableDirectoryFromTheEnvironment) {
-  const std::pair<std::optional<std::string>, std::string> rows[] = {
-      {std::nullopt, "[Status:]This is not portable version of RUV"},
+  const std::pair<std::string, std::string> rows[] = {
       {"", "[Status:]This is not portable version of RUV"},
       {"/media/usb ruv", "[Status:]This is a portable RUV,portablePath = /media/usb ruv"},
   };
-  const Installation machine;
-  for (const auto& [variable, line] : rows) {
-    fs::remove(kTraceFile);
-    machine.Run({}, Environment("ZEM_PORTABLE_EXEC_DIR", variable));
+  for (const auto& [directory, line] : rows) {
+    const Installation machine;
+    machine.Run({}, Environment("ZEM_PORTABLE_EXEC_DIR", directory));
     EXPECT_THAT(machine.TraceLines(line), ElementsAre(""));
   }
 }

@@ -31,8 +31,6 @@ std::string RecordingProgram(const std::string& record, const std::string& then)
   return "#!/bin/sh\n{ for argument; do printf '[%s]' \"$argument\"; done; echo; } >>'" + record + "'\n" + then + "\n";
 }
 
-const char* Wrapper() { return std::getenv("RUV_TEST_WRAPPER"); }
-
 int OpenTerminal() {
   const int terminal = posix_openpt(O_RDWR | O_CLOEXEC | O_NOCTTY);
   grantpt(terminal);
@@ -45,39 +43,32 @@ void TypeAfterTheQuestion(int terminal, const std::string& text, const std::stri
   EXPECT_EQ(write(terminal, text.data(), text.size()), static_cast<ssize_t>(text.size()));
 }
 
-[[noreturn]] void ExecuteLauncher(const std::string& launcher, Strings arguments, const RunOptions& options,
-                                  const std::string& input, const std::string& output, const std::string& directory) {
-  for (const auto& [name, value] : options.environment) {
-    value ? setenv(name.c_str(), value->c_str(), 1) : unsetenv(name.c_str());
-  }
+// Becomes a shell that becomes the launcher.
+[[noreturn]] void ExecuteLauncher(const std::string& directory, const Strings& arguments, const RunOptions& options,
+                                  const std::string& input) {
   const int in = open(input.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY | (options.terminal ? O_NONBLOCK : 0));
-  const int out = open(output.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
-  if (in < 0 || out < 0 || chdir(directory.c_str()) != 0) _exit(125);
+  const int out = open((directory + "/stdout").c_str(), O_WRONLY | O_CLOEXEC);
+  if (in < 0 || out < 0 || chdir((directory + "/cwd").c_str()) != 0) _exit(125);
   dup2(in, STDIN_FILENO);
   dup2(out, STDOUT_FILENO);
   dup2(out, STDERR_FILENO);
   setpgid(0, 0);
-  std::signal(SIGINT, SIG_DFL);
+  for (const int signal : {SIGINT, SIGPIPE, SIGXFSZ, SIGCHLD}) std::signal(signal, SIG_DFL);
   alarm(kTimeLimit);
-  std::string program = launcher;
-  if (options.argv0 || (options.prelude.empty() && Wrapper() == nullptr)) {
-    arguments.insert(arguments.begin(), options.argv0.value_or(launcher));
-  } else {
-    const std::string words = Wrapper() == nullptr ? "" : Wrapper() + std::string(" ");
-    arguments.insert(arguments.begin(),
-                     {"sh", "-c", "set -- " + words + "\"$@\"\n" + options.prelude + "\nexec \"$@\"", "sh", launcher});
-    program = "/bin/sh";
-  }
+  Strings words = {"sh", "-c",
+                   "unset ZEM_PORTABLE_EXEC_DIR\n" + options.prelude + "\nexec $with $RUV_TEST_WRAPPER \"$0\" \"$@\"",
+                   directory + "/launcher"};
+  words.insert(words.end(), arguments.begin(), arguments.end());
   std::vector<char*> argv;
-  for (std::string& argument : arguments) argv.push_back(argument.data());
+  for (std::string& word : words) argv.push_back(word.data());
   argv.push_back(nullptr);
-  execv(program.c_str(), argv.data());
+  execv("/bin/sh", argv.data());
   _exit(126);
 }
 
 }  // namespace
 
-bool IsInstrumented() { return RUV_SANITIZED || Wrapper() != nullptr; }
+bool IsInstrumented() { return *RUV_SANITIZE != '\0' || std::getenv("RUV_TEST_WRAPPER") != nullptr; }
 
 void WriteFile(const std::string& path, const std::string& text) {
   fs::create_directories(fs::path(path).parent_path());
@@ -139,7 +130,7 @@ RunResult Installation::Run(const Strings& arguments, const RunOptions& options)
   const int terminal = options.terminal ? OpenTerminal() : -1;
   if (options.terminal) input = ptsname(terminal);
   const pid_t child = fork();
-  if (child == 0) ExecuteLauncher(directory_ + "/launcher", arguments, options, input, output, directory_ + "/cwd");
+  if (child == 0) ExecuteLauncher(directory_, arguments, options, input);
   if (options.terminal) TypeAfterTheQuestion(terminal, options.input, output);
   int status = 0;
   waitpid(child, &status, 0);

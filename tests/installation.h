@@ -1,13 +1,11 @@
 // The launcher, installed in a fresh directory with stand-ins for the programs that it runs. Each run is a real
 // process; what it did is read back as the user and the other programs saw it.
-#ifndef RUV_TESTS_INSTALLATION_H
-#define RUV_TESTS_INSTALLATION_H
+#pragma once
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <map>
-#include <optional>
 #include <string>
 #include <vector>
 
@@ -20,19 +18,21 @@ inline constexpr const char* kRepository = "/var/ZEM_Support";
 inline constexpr const char* kExpansionDirectory = "/tmp/tav";
 
 struct RunOptions {
-  std::string input;                                              // standard input, to its end
-  std::map<std::string, std::optional<std::string>> environment;  // no value: the variable is removed
-  std::optional<std::string> argv0;                               // the name to start under, instead of the full path
-  std::string prelude;                                            // shell text run just before the launcher
+  std::string input;      // standard input, to its end
+  std::string prelude;    // shell text run just before the launcher; may put a command that starts it into $with
   bool terminal = false;  // standard input is a non-blocking terminal; the input is typed after the question
 };
-inline RunOptions Input(const std::string& text) { return {text, {}, {}, "", false}; }
-inline RunOptions Environment(const std::string& name, const std::optional<std::string>& value) {
-  return {"", {{name, value}}, {}, "", false};
+inline RunOptions Input(const std::string& text) { return {text, "", false}; }
+inline RunOptions Typed(const std::string& text) { return {text, "", true}; }
+inline RunOptions Prelude(const std::string& shell_text) { return {"", shell_text, false}; }
+inline RunOptions With(const std::string& command) { return Prelude("with='" + command + "'"); }
+inline RunOptions Environment(const std::string& name, const std::string& value) {
+  return Prelude("export " + name + "='" + value + "'");
 }
-inline RunOptions StartedAs(const std::string& argv0) { return {"", {}, argv0, "", false}; }
-inline RunOptions Prelude(const std::string& shell_text) { return {"", {}, {}, shell_text, false}; }
-inline RunOptions Typed(const std::string& text) { return {text, {}, {}, "", true}; }
+// Starts the launcher under another name than its full path.
+inline RunOptions StartedAs(const std::string& name) {
+  return Prelude("exec bash -c 'exec -a \"$0\" \"$@\"' '" + name + "' \"$0\" \"$@\"");
+}
 
 struct RunResult {
   int status = -1;  // exit status; 1000 + N if signal N ended the launcher
@@ -87,5 +87,3 @@ bool IsInstrumented();
 
 void WriteFile(const std::string& path, const std::string& text);
 std::string ReadFile(const std::string& path);  // empty if there is no such file
-
-#endif  // RUV_TESTS_INSTALLATION_H

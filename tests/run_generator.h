@@ -1,6 +1,5 @@
 // Everything that one run of the launcher meets, drawn at random: ordinary, odd and broken.
-#ifndef RUV_TESTS_RUN_GENERATOR_H
-#define RUV_TESTS_RUN_GENERATOR_H
+#pragma once
 
 #include <cstdint>
 #include <map>
@@ -26,5 +25,3 @@ constexpr const char* kEarlierTrace = "[TAVRUV]: of an earlier run\n";
 // digit 7, and punctuation without '>', '&' and braces: no text can name a program, write to a file, stay in the
 // background or define what calls itself.
 GeneratedRun GenerateRun(std::uint64_t seed);
-
-#endif  // RUV_TESTS_RUN_GENERATOR_H

@@ -154,31 +154,23 @@ TEST(RunSequence, LaunchModeComparesIfThereIsARepository) {
 TEST(RunSequence, ExtendsTheSearchPathsForEveryProgram) {
   if (IsInstrumented()) GTEST_SKIP() << "valgrind extends LD_LIBRARY_PATH itself";
   const std::string libraries = "./:./qlogic/qcccli/:./qlogic/:./fibre/:./megalsi:./mellanox:./nvidia";
-  struct Row {
-    std::optional<std::string> library_path;
-    std::string library_path_after;
-    std::string path;
-  };
-  const Row rows[] = {
-      {std::nullopt, libraries, "/usr/bin:/bin"},
-      {"", ":" + libraries, "/bin:./mellanox"},
-      {"/usr/lib", "/usr/lib:" + libraries, "/usr/bin:/bin"},
+  const std::pair<std::string, std::string> rows[] = {
+      {"unset LD_LIBRARY_PATH; PATH=/usr/bin:/bin", libraries + "|/usr/bin:/bin:./mellanox\n"},
+      {"export LD_LIBRARY_PATH=; PATH=/bin:./mellanox", ":" + libraries + "|/bin:./mellanox:./mellanox\n"},
+      {"export LD_LIBRARY_PATH=/usr/lib; PATH=/bin", "/usr/lib:" + libraries + "|/bin:./mellanox\n"},
   };
   const Installation machine;
   for (const char* program : {"ruv", "guihelper.sh"}) {
     machine.Install(program, "echo \"$LD_LIBRARY_PATH|$PATH\" >\"$0.environment\"");
   }
-  for (const Row& row : rows) {
-    RunOptions options = Environment("LD_LIBRARY_PATH", row.library_path);
-    options.environment["PATH"] = row.path;
-    machine.Run({}, options);
-    const std::string expected = row.library_path_after + "|" + row.path + ":./mellanox\n";
-    EXPECT_EQ(ReadFile(machine.Directory() + "/ruv.environment"), expected);
-    EXPECT_EQ(ReadFile(machine.Directory() + "/guihelper.sh.environment"), expected);
+  for (const auto& [prelude, environment] : rows) {
+    machine.Run({}, Prelude(prelude));
+    EXPECT_EQ(ReadFile(machine.Directory() + "/ruv.environment"), environment);
+    EXPECT_EQ(ReadFile(machine.Directory() + "/guihelper.sh.environment"), environment);
   }
   // Shells have a PATH of their own if there is none: the application reads its environment as the kernel shows it.
   machine.Install("ruv", "/bin/cat /proc/self/environ >\"$0.environment\"");
-  machine.Run({}, Environment("PATH", std::nullopt));
+  machine.Run({}, Prelude("unset PATH"));
   EXPECT_THAT(ReadFile(machine.Directory() + "/ruv.environment"), HasSubstr(std::string("\0PATH=./mellanox\0", 17)));
 }
 
@@ -200,7 +192,7 @@ TEST(RunSequence, EndsAtOnceIfTheToolIsInterrupted) {
     machine.CreateRepository();
     // Like Ctrl-C: signals the whole foreground process group, here one of the launcher's own.
     machine.Install("tavtool", "kill -INT 0; sleep 1");
-    const RunResult run = machine.Run({option}, Prelude("set -- setsid --wait \"$@\""));
+    const RunResult run = machine.Run({option}, With("setsid --wait"));
     EXPECT_EQ(run.status, 1);
     EXPECT_THAT(run.out, EndsWith("RUV application is determined by the user!\n"));
     EXPECT_THAT(machine.Trace(), EndsWith(" 2>&1\n"));
@@ -213,8 +205,7 @@ TEST(RunSequence, GetsExitCodesAlthoughItsParentIgnoresSigchld) {
   const Installation machine;
   machine.CreateRepository();
   machine.InstallTool({{"comparelocal", 30}});
-  EXPECT_EQ(machine.Run({}, Prelude("set -- env --ignore-signal=CHLD \"$@\"")).out,
-            "You already have the latest version RUV.\n");
+  EXPECT_EQ(machine.Run({}, With("env --ignore-signal=CHLD")).out, "You already have the latest version RUV.\n");
 }
 
 TEST(RunSequence, SurvivesAConsoleThatNobodyReads) {
@@ -258,7 +249,7 @@ std::map<std::string, int> RunsOutOfMemory(const Strings& arguments, int bytes, 
   machine.Install("ruv", "echo started");
   for (; run.status <= 1; bytes -= bytes / (run.out == "started\n" ? 16 : steps)) {
     fs::remove(kTraceFile);
-    run = machine.Run(arguments, Prelude("set -- prlimit --as=" + std::to_string(bytes) + " \"$@\""));
+    run = machine.Run(arguments, With("prlimit --as=" + std::to_string(bytes)));
     if (run.status != 1) continue;
     EXPECT_THAT(run.out, EndsWith("ERROR: Not enough memory, RUV launcher ends.\n"));
     const Strings lines = machine.TraceLines("");

@@ -29,26 +29,15 @@ TEST(Session, TestsForFilesAndDirectoriesFollowLinks) {
   }
 }
 
-TEST(Session, QuotesAPathAsItIs) {
-  const Installation machine;
-  const NZEMRUVTAV::TAVMaster session;
-  std::string path = "a \"b\"";
-  session.FormatPathString(path);
-  EXPECT_EQ(path, "\"a \"b\"\"");
-  path.clear();
-  session.FormatPathString(path);
-  EXPECT_EQ(path, "\"\"");
-}
-
 TEST(Session, RemembersPrebootOptions) {
   const Installation machine;
-  char program[] = "launcher", gui[] = "--gui", cmd[] = "--cmd";
   NZEMRUVTAV::TAVMaster session;
+  std::string words[] = {"launcher", "--gui", "--cmd"};
+  char* gui[] = {words[0].data(), words[1].data()};
+  char* cmd[] = {words[0].data(), words[2].data()};
   EXPECT_FALSE(session.isPrebootGUI() || session.isPrebootCmd());
-  char* with_gui[] = {program, gui};
-  session.ParseParameters(2, with_gui);
+  session.ParseParameters(2, gui);
   EXPECT_TRUE(session.isPrebootGUI() && !session.isPrebootCmd());
-  char* with_cmd[] = {program, cmd};
-  session.ParseParameters(2, with_cmd);
+  session.ParseParameters(2, cmd);
   EXPECT_TRUE(session.isPrebootCmd());
 }

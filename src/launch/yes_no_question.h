@@ -1,5 +1,4 @@
-#ifndef RUV_LAUNCH_YES_NO_QUESTION_H
-#define RUV_LAUNCH_YES_NO_QUESTION_H
+#pragma once
 
 namespace NZEMRUVTAV {
 
@@ -9,5 +8,3 @@ namespace NZEMRUVTAV {
 bool UserAgrees();
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_LAUNCH_YES_NO_QUESTION_H

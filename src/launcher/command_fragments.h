@@ -1,6 +1,5 @@
 // The fixed words of the commands that the launcher runs through the shell.
-#ifndef RUV_LAUNCHER_COMMAND_FRAGMENTS_H
-#define RUV_LAUNCHER_COMMAND_FRAGMENTS_H
+#pragma once
 
 #include <string>
 
@@ -24,5 +23,3 @@ inline const std::string MKDIR = "mkdir -p";
 inline const std::string COPYSCRIPT = "copy.sh";
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_LAUNCHER_COMMAND_FRAGMENTS_H

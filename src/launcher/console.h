@@ -1,6 +1,5 @@
 // Messages for the user: standard output only. Write errors are ignored.
-#ifndef RUV_LAUNCHER_CONSOLE_H
-#define RUV_LAUNCHER_CONSOLE_H
+#pragma once
 
 #include <cstdio>
 
@@ -19,5 +18,3 @@ inline void PrintLine(const char* text) {
 }
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_LAUNCHER_CONSOLE_H

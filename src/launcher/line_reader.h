@@ -1,5 +1,4 @@
-#ifndef RUV_LAUNCHER_LINE_READER_H
-#define RUV_LAUNCHER_LINE_READER_H
+#pragma once
 
 #include <cstdio>
 #include <string>
@@ -29,5 +28,3 @@ class LineReader {
 };
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_LAUNCHER_LINE_READER_H

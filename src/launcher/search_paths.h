@@ -1,5 +1,4 @@
-#ifndef RUV_LAUNCHER_SEARCH_PATHS_H
-#define RUV_LAUNCHER_SEARCH_PATHS_H
+#pragma once
 
 namespace NZEMRUVTAV {
 
@@ -8,5 +7,3 @@ namespace NZEMRUVTAV {
 void ExtendSearchPaths();
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_LAUNCHER_SEARCH_PATHS_H

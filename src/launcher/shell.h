@@ -1,6 +1,5 @@
 // The only way in which the launcher runs other programs.
-#ifndef RUV_LAUNCHER_SHELL_H
-#define RUV_LAUNCHER_SHELL_H
+#pragma once
 
 #include <cstdlib>
 #include <string>
@@ -13,5 +12,3 @@ namespace NZEMRUVTAV {
 inline int RunInShell(const std::string& command) { return std::system(command.c_str()); }
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_LAUNCHER_SHELL_H

@@ -1,5 +1,4 @@
-#ifndef RUV_LAUNCHER_SIGNALS_H
-#define RUV_LAUNCHER_SIGNALS_H
+#pragma once
 
 namespace NZEMRUVTAV {
 
@@ -11,5 +10,3 @@ namespace NZEMRUVTAV {
 void PrepareSignals();
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_LAUNCHER_SIGNALS_H

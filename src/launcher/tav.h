@@ -10,8 +10,7 @@
 //   (FormatPathString) unless a member says "bare"; nothing inside the quotes is escaped.
 // - A working member writes "[Debug:] Entering TAVMaster::X()" and "[Debug:] Exiting TAVMaster::X()" to the trace.
 // - Console texts go to standard output.
-#ifndef RUV_LAUNCHER_TAV_H
-#define RUV_LAUNCHER_TAV_H
+#pragma once
 
 #include <set>
 #include <string>
@@ -200,5 +199,3 @@ class TAVMaster {
 };
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_LAUNCHER_TAV_H

@@ -1,5 +1,4 @@
-#ifndef RUV_LOG_TRACE_SCOPE_H
-#define RUV_LOG_TRACE_SCOPE_H
+#pragma once
 
 #include <exception>
 #include <string>
@@ -38,5 +37,3 @@ class TraceScope {
 };
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_LOG_TRACE_SCOPE_H

@@ -1,6 +1,5 @@
 // The meaning of the package tool's exit codes: the tables used by the launcher and by ruv-trace.
-#ifndef RUV_PACKAGES_EXIT_CODE_TABLES_H
-#define RUV_PACKAGES_EXIT_CODE_TABLES_H
+#pragma once
 
 namespace NZEMRUVTAV {
 
@@ -44,5 +43,3 @@ inline constexpr ErrMsg ErrMsgs[] = {
 };
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_PACKAGES_EXIT_CODE_TABLES_H

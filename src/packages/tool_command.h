@@ -1,5 +1,4 @@
-#ifndef RUV_PACKAGES_TOOL_COMMAND_H
-#define RUV_PACKAGES_TOOL_COMMAND_H
+#pragma once
 
 #include <string>
 #include <utility>
@@ -23,5 +22,3 @@ struct TAVMaster::ToolCall {
 };
 
 }  // namespace NZEMRUVTAV
-
-#endif  // RUV_PACKAGES_TOOL_COMMAND_H
