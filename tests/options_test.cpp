@@ -106,8 +106,8 @@ TEST(Options, HelpPrintsTheUsageText) {
   EXPECT_EQ(run.status, 0);
   // FNV-1a of the text, without the download page, which is set when the launcher is built.
   std::uint64_t sum = 14695981039346656037U;
-  for (const unsigned char byte : std::regex_replace(run.out, std::regex("https?://.*"), "URL")) {
-    sum = (sum ^ byte) * 1099511628211U;
+  for (const char byte : std::regex_replace(run.out, std::regex("https?://.*"), "URL")) {
+    sum = (sum ^ static_cast<unsigned char>(byte)) * 1099511628211U;
   }
   EXPECT_EQ(sum, 12489178673586594946U) << "after a change of the usage text, put the new sum here";
   EXPECT_THAT(machine.Trace(), EndsWith("[Debug:] Entering TAVMaster::ParseParameters()\n"));
