@@ -62,7 +62,7 @@ std::string RunningExecutable() {
     }
     path.resize(path.size() * 2);
   }
-  const auto* executed = reinterpret_cast<const char*>(getauxval(AT_EXECFN));
+  const auto* executed = reinterpret_cast<const char*>(getauxval(AT_EXECFN));  // NOLINT(performance-no-int-to-ptr)
   return executed == nullptr ? "" : executed;
 }
 
