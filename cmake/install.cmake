@@ -29,8 +29,13 @@ endif()
 # In /usr of a system that has the package.
 install(FILES docs/administrator.md RENAME README.md DESTINATION ${documents} COMPONENT documents)
 install(FILES docs/security.md DESTINATION ${documents} COMPONENT documents)
-install(FILES completions/launcher.bash RENAME launcher DESTINATION share/bash-completion/completions
-        COMPONENT documents)
+foreach(program launcher ruv-trace)
+  install(FILES completions/${program}.bash RENAME ${program} DESTINATION share/bash-completion/completions
+          COMPONENT documents)
+  install(FILES completions/${program}.zsh RENAME _${program} DESTINATION share/zsh/site-functions COMPONENT generic)
+  install(FILES completions/${program}.zsh RENAME _${program} DESTINATION share/zsh/vendor-completions
+          COMPONENT debian EXCLUDE_FROM_ALL)
+endforeach()
 install(FILES packaging/tmpfiles.conf RENAME ruv-launcher.conf DESTINATION lib/tmpfiles.d COMPONENT documents)
 install(FILES packaging/ruv-launcher.service packaging/ruv-launcher.timer DESTINATION lib/systemd/system
         COMPONENT documents)
@@ -40,7 +45,6 @@ install(FILES packaging/logrotate.conf RENAME ruv-launcher DESTINATION etc/logro
 
 # In /usr as well; Debian has its own names and directories for these, see below.
 install(FILES LICENSE CHANGELOG.md DESTINATION ${documents} COMPONENT generic)
-install(FILES completions/launcher.zsh RENAME _launcher DESTINATION share/zsh/site-functions COMPONENT generic)
 
 ruv_compress(${PROJECT_SOURCE_DIR}/CHANGELOG.md changelog)
 string(TIMESTAMP build_time "%a, %d %b %Y %H:%M:%S +0000" UTC)
@@ -49,7 +53,5 @@ ruv_compress(${PROJECT_BINARY_DIR}/changelog.Debian debian_changelog)
 install(FILES LICENSE RENAME copyright DESTINATION ${documents} COMPONENT debian EXCLUDE_FROM_ALL)
 install(FILES ${changelog} RENAME changelog.gz DESTINATION ${documents} COMPONENT debian EXCLUDE_FROM_ALL)
 install(FILES ${debian_changelog} DESTINATION ${documents} COMPONENT debian EXCLUDE_FROM_ALL)
-install(FILES completions/launcher.zsh RENAME _launcher DESTINATION share/zsh/vendor-completions
-        COMPONENT debian EXCLUDE_FROM_ALL)
 install(FILES packaging/debian/lintian-overrides RENAME ruv-launcher DESTINATION share/lintian/overrides
         COMPONENT debian EXCLUDE_FROM_ALL)

@@ -1,8 +1,8 @@
 #!/usr/bin/env bash
-# Compares the completions for bash and zsh with the usage text: they must offer the same options and values.
-# Usage: tests/completion_test.sh LAUNCHER     (exit status 77, "skipped", without zsh)
+# Compares the completions for bash and zsh with the usage texts: they must offer the same options and values.
+# Usage: tests/completion_test.sh LAUNCHER [RUV-TRACE]     (exit status 77, "skipped", without zsh)
 set -euo pipefail
-launcher=$1
+launcher=$1 ruv_trace=${2-}
 cd "$(dirname "${BASH_SOURCE[0]}")/../completions"
 if ! command -v zsh >/dev/null; then
   echo "skipped: zsh is not installed"
@@ -16,18 +16,19 @@ usage=$("$launcher" -h | sed '1,/^Options:$/d')
 options() { grep '^-' | grep -oE '(^|[ ,[])--?([a-z][a-z_-]*=?|\?)' | tr -d ' ,['; }
 values_of() { sed -n "/^$1 /,/^ *This/p" <<<"$usage" | grep -oE '\[[a-z0-9.]+\]' | tr -d '[]'; }
 
-# Prints what bash offers after the words of a command line.
-in_bash() {
+# Prints what bash offers for the last word of a command line.
+in_bash() { # WORD...
   bash -c 'compopt() { :; }
-    source ./launcher.bash
+    source "./$1.bash"
     COMP_WORDS=("$@") COMP_CWORD=$(($# - 1))
-    _launcher
+    "_${1//-/_}"
     printf "%s\n" "${COMPREPLY[@]}"' bash "$@"
 }
 
-# The option descriptions passed to zsh's own function: "(EXCLUDED)OPTION[TEXT]:WHAT:(VALUES)".
-zsh_descriptions=$(zsh -fc '_arguments() { print -rl -- "$@" }; source ./launcher.zsh')
-in_zsh() { sed -n "s/^[^:]*$1\[.*:(\(.*\))\$/\1/p" <<<"$zsh_descriptions" | tr ' ' '\n'; }
+# Prints what a program's completion passes to zsh's own function: "(EXCLUDED)OPTION[TEXT]:WHAT:(VALUES)" per line.
+zsh_descriptions() { zsh -fc '_arguments() { print -rl -- "$@" }; source "./$1.zsh"' zsh "$1"; }
+options_in() { sed -En 's/^(\([^)]*\))?(-[^[]*)\[.*/\2/p' | tr -d "\\"; }
+in_zsh() { zsh_descriptions launcher | sed -n "s/^[^:]*$1\[.*:(\(.*\))\$/\1/p" | tr ' ' '\n'; }
 
 failed=
 expect_same() { # WHAT EXPECTED ACTUAL
@@ -35,9 +36,16 @@ expect_same() { # WHAT EXPECTED ACTUAL
 }
 expected=$(options <<<"$usage" && printf '%s\n' "${unlisted[@]}")
 expect_same "bash, options" "$expected" "$(in_bash launcher -)"
-expect_same "zsh, options" "$expected" "$(sed -E 's/^\([^)]*\)//; s/\[.*//; s/\\//' <<<"$zsh_descriptions")"
+expect_same "zsh, options" "$expected" "$(zsh_descriptions launcher | options_in)"
 for option in --update_os --update_arch; do
   expect_same "bash, $option" "$(values_of "$option")" "$(in_bash launcher "$option" '')"
   expect_same "zsh, $option" "$(values_of "$option")" "$(in_zsh "$option")"
 done
+
+if [[ -n $ruv_trace ]]; then
+  expected=$("$ruv_trace" --help | grep -oE '^  -[^ ]+( -[^ ]+)?' | tr -d , | tr ' ' '\n' | grep .)
+  expect_same "bash, ruv-trace" "$expected" "$(in_bash ruv-trace -)"
+  expect_same "zsh, ruv-trace" "$expected" "$(zsh_descriptions ruv-trace | options_in)"
+  expect_same "bash, files" "$(ls)" "$(in_bash ruv-trace '')"
+fi
 [[ -z $failed ]]

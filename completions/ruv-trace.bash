@@ -1,0 +1,12 @@
+# Completion of ruv-trace's command line for bash: options and files.
+_ruv_trace() {
+  local current=${COMP_WORDS[COMP_CWORD]}
+  if [[ $current == -* ]]; then
+    mapfile -t COMPREPLY < <(compgen -W '--problems --long --json --check --show-passwords -h --help --version' \
+      -- "$current")
+  else
+    compopt -o filenames
+    mapfile -t COMPREPLY < <(compgen -f -- "$current")
+  fi
+}
+complete -F _ruv_trace ruv-trace

@@ -1,0 +1,11 @@
+#compdef ruv-trace
+# Completion of ruv-trace's command line for zsh: options and files.
+_arguments \
+  '--problems[show only the runs that are not ok]' \
+  '(--json --check)--long[also show tool calls, commands and lines of the file]' \
+  '(--long)--json[print one JSON object per run]' \
+  '(--long)--check[judge the last run]' \
+  '--show-passwords[show the passwords in commands]' \
+  '(- *)'{-h,--help}'[show the options]' \
+  '(- *)--version[show the version]' \
+  '*:trace file:_files'
