@@ -1,14 +1,14 @@
 #!/bin/sh
 # Looks at this machine and writes the system information file that the launcher reads.
 # RUV_SAMPLE_OS, RUV_SAMPLE_MT and RUV_SAMPLE_ARCH, where set, stand in for what is found.
-# Exit status: 0, or 1 with a message on standard error when the file cannot be written; the old one then stays.
+# Exit status: 0, or 1 with a message on standard error if the file cannot be written; the old one then stays.
 set -u
 
 directory=/var/log/TAV_Support
 file=$directory/guihelp.dat
 
-# The launcher's code for the distribution. A release newer than all that have a code gets the newest one's;
-# a distribution without any gets 0, "NONE".
+# The launcher's code for the distribution. A release newer than all with a code gets the newest code; an
+# unknown distribution gets 0, "NONE".
 operating_system_code() {
   ID='' VERSION_ID=''
   # shellcheck source=/dev/null
@@ -26,8 +26,8 @@ operating_system_code() {
   esac
 }
 
-# The first four letters or digits of the product name that the firmware reports; 0000 without one. Nothing else gets
-# through: the launcher puts the machine type on command lines as it is.
+# The first four letters or digits of the product name that the firmware reports; 0000 without one. No other
+# characters, because the launcher puts the machine type on command lines unquoted.
 machine_type() {
   product=$(tr -cd 'A-Za-z0-9' 2>/dev/null </sys/class/dmi/id/product_name | cut -c 1-4)
   echo "${product:-0000}"

@@ -33,7 +33,7 @@ expect 7 'namespace package' "$sandbox" --state state sh -c "$write"
 expect 125 'sandbox: no command was given' "$sandbox" --state state
 expect 0 'Runs a command*--keep*' "$sandbox" --help
 
-# The state is the same one where namespaces are refused, and the paths themselves are left as they were.
+# Where namespaces are refused, the state is kept too, and the real paths are restored.
 expect 7 'real-paths package' refused --state state sh -c "$write"
 expect 7 'real-paths ' refused sh -c "$write"
 expect 0 '' sh -c "$list"
