@@ -131,7 +131,10 @@ TEST(Discovery, FindsTheLaunchersDirectory) {
     EXPECT_THAT(machine.TraceLines(machine.WithPlainDirectory(message)), ElementsAre(""));
   }
   fs::remove(kTraceFile);
-  machine.Run({}, Prelude("exec bash -c 'exec -a launcher \"$0\" -b' " + long_directory + "/launcher"));
+  // A link on the search path leads to the directory of the executable, not to its own.
+  fs::create_directory(machine.Directory() + "/links");
+  fs::create_symlink(long_directory + "/launcher", machine.Directory() + "/links/launcher");
+  machine.Run({}, Prelude("PATH=\"" + machine.Directory() + "/links:$PATH\"; exec launcher -b"));
   EXPECT_THAT(machine.TraceLines("[Status:]Working Path = ").at(0), StartsWith("@/" + long_name + "/" + long_name));
   // Not in the directories of the third and the sixth row.
   EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(6));

@@ -33,8 +33,8 @@ TEST(Packages, StepsRecreateMissingDirectories) {
   machine.Install("tavtool",
                   "ls -d /var/ZEM_Support /tmp/tav >>../seen\n"
                   "case $1 in acquire) rm -r /var/ZEM_Support ;;\n"
-                  "comparelocal) mv /tmp/tav /tmp/expanded; rm -r /var/ZEM_Support; exit 21 ;;\n"
-                  "expand) mv /tmp/expanded/* /tmp/tav ;; esac");
+                  "comparelocal) mv /tmp/tav ../expanded; rm -r /var/ZEM_Support; exit 21 ;;\n"
+                  "expand) mv ../expanded/* /tmp/tav ;; esac");
   EXPECT_THAT(machine.Run({"--update"}).out, EndsWith("Done\nDone\n"));
   const std::string both = "/tmp/tav\n/var/ZEM_Support\n";
   EXPECT_EQ(ReadFile(machine.Directory() + "/seen"), "/tmp/tav\n" + both + both + both);

@@ -1,5 +1,6 @@
 // ruv-trace's reports of real runs.
 #include <cstdio>
+#include <cstdlib>
 #include <nlohmann/json.hpp>
 #include <sstream>
 
@@ -13,7 +14,8 @@ namespace {
 // Runs ruv-trace. Returns both of its outputs and, unless it is 0, its exit status.
 std::string Report(const Installation& machine, const std::string& arguments = "") {
   std::string text;
-  std::FILE* pipe = popen((RUV_TRACE_EXE " 2>&1 " + arguments).c_str(), "r");
+  setenv("RUV_TRACE", RUV_TRACE_EXE, 1);
+  std::FILE* pipe = popen(("\"$RUV_TRACE\" 2>&1 " + arguments).c_str(), "r");
   for (int byte = 0; (byte = std::getc(pipe)) != EOF;) text.push_back(static_cast<char>(byte));
   const int status = pclose(pipe);
   return machine.WithPlainDirectory(text) + (status == 0 ? "" : "status " + std::to_string(status >> 8));

@@ -42,8 +42,7 @@ void TAVMaster::DebugLog(const char* format, ...) const noexcept {
   bool saved = false;
   try {
     saved = AppendLine(GetLogfileName(), std::string(kLinePrefix) + message + "\n");
-  } catch (const std::bad_alloc&) {
-    saved = false;
+  } catch (const std::bad_alloc&) {  // not saved
   }
   if (!saved) PrintLine("Failed to save log into logfile");
 }
