@@ -45,8 +45,8 @@ Json JsonCalls(const Run& run, bool show_passwords) {
 bool IsControl(std::string_view character) {
   return character == "\x7F" || (character >= "\xC2\x80" && character < "\xC2\xA0") || character == "\xD8\x9C" ||
          (character >= "\xE2\x80\x8B" && character <= "\xE2\x80\x8F") ||
-         (character >= "\xE2\x80\xA8" && character <= "\xE2\x80\xAE") ||
-         (character >= "\xE2\x81\xA6" && character <= "\xE2\x81\xA9");
+         (character >= "\xE2\x80\xA8" && character < "\xE2\x80\xAF") ||
+         (character > "\xE2\x81\xA5" && character < "\xE2\x81\xAA");
 }
 
 bool StartsCharacter(char byte) { return (static_cast<unsigned char>(byte) & 0xC0U) != 0x80U; }

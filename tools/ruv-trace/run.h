@@ -62,7 +62,7 @@ class Run {
   // Takes a message of the trace. Returns false if no launcher writes it at this point of a run.
   bool Take(std::string_view message);
   // Takes a line of something else: of the copy script, or of a command that has a line feed in it.
-  void TakeOther(std::string_view line);
+  void TakeOther(std::string_view text);
   // Makes uncertain what comes after the point at which the other run was left.
   void BeginBeforeEndOf(const Run& other);
   // Drops everything: a line is out of turn.
