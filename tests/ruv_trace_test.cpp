@@ -1,25 +1,90 @@
-// ruv-trace's reports of real runs.
+// ruv-trace's reports, also of runs at the same time and of damaged traces.
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <filesystem>
 #include <nlohmann/json.hpp>
+#include <random>
+#include <set>
 #include <sstream>
 
 #include "installation.h"
 
 using nlohmann::json;
+using ::testing::AllOf;
+using ::testing::AnyOf;
+using ::testing::Each;
+using ::testing::EndsWith;
 using ::testing::HasSubstr;
+using ::testing::IsEmpty;
+using ::testing::MatchesRegex;
+using ::testing::Not;
+using ::testing::SizeIs;
+using ::testing::StartsWith;
+
+namespace fs = std::filesystem;
 
 namespace {
 
-// Runs ruv-trace. Returns both of its outputs and, unless it is 0, its exit status.
-std::string Report(const Installation& machine, const std::string& arguments = "") {
-  std::string text;
+const std::string kHeader = "RUN VERDICT MACHINE DID    PACKAGE AND RUV, OR WHAT IS WRONG\n";
+
+// Returns both outputs of ruv-trace and, unless it is 0, its exit status. The arguments are shell text.
+std::string Report(const std::string& arguments = "") {
   setenv("RUV_TRACE", RUV_TRACE_EXE, 1);
-  std::FILE* pipe = popen(("\"$RUV_TRACE\" 2>&1 " + arguments).c_str(), "r");
+  std::string text;
+  std::FILE* pipe = popen(("exec 2>&1; \"$RUV_TRACE\" " + arguments).c_str(), "r");
   for (int byte = 0; (byte = std::getc(pipe)) != EOF;) text.push_back(static_cast<char>(byte));
   const int status = pclose(pipe);
-  return machine.WithPlainDirectory(text) + (status == 0 ? "" : "status " + std::to_string(status >> 8));
+  return text + (status == 0 ? "" : "status " + std::to_string(status >> 8));
 }
+
+std::string ReportOf(const std::string& trace, const std::string& arguments = "") {
+  WriteFile(kTraceFile, trace);
+  return Report(arguments);
+}
+
+Strings Lines(const std::string& text) {
+  std::istringstream stream(text);
+  Strings lines;
+  for (std::string line; std::getline(stream, line);) lines.push_back(line + "\n");
+  return lines;
+}
+
+std::string Joined(const Strings& lines) {
+  std::string text;
+  for (const std::string& line : lines) text += line;
+  return text;
+}
+
+std::vector<json> Runs(const std::string& arguments = "") {
+  std::vector<json> runs;
+  for (const std::string& line : Lines(Report("--json " + arguments))) runs.push_back(json::parse(line));
+  return runs;
+}
+
+std::vector<json> RunsOf(const std::string& trace) {
+  WriteFile(kTraceFile, trace);
+  return Runs();
+}
+
+// Prepares a machine with a newer package in the repository.
+void ProvidePackage(const Installation& machine, const std::string& copy_script = "echo copied") {
+  machine.CreateRepository();
+  machine.InstallTool({{"comparelocal", 21}}, "Version=2.31\n");
+  machine.InstallCopyScript(copy_script);
+}
+
+// Returns the trace of one run with all its package steps.
+std::string TraceOf(const Strings& arguments, bool portable) {
+  const Installation machine;
+  ProvidePackage(machine);
+  fs::create_directories(machine.Directory() + "/media/update");
+  machine.Run(arguments, Environment("ZEM_PORTABLE_EXEC_DIR", portable ? machine.Directory() + "/media" : ""));
+  return ReadFile(kTraceFile);
+}
+
+const std::vector<std::pair<Strings, bool>> kCompleteRuns = {
+    {{"-b"}, false}, {{"-b"}, true}, {{"--update"}, false}, {{"--update"}, true}, {{"--ipmi-lan"}, false}};
 
 }  // namespace
 
@@ -27,24 +92,351 @@ TEST(RuvTrace, ReportsWhatARunDid) {
   struct Row {
     Strings arguments;
     std::map<std::string, int> tool;  // its exit codes
-    std::string line;
-    std::string ruv;
+    std::string verdict;
+    std::string outcome;
+    std::string package;  // in JSON
   };
+  const std::string same = "launch package: nothing newer; ruv started";
+  const std::string installed = "launch 2.31: copy script ran; ruv started";
   const Row rows[] = {
-      {{"-b"}, {}, "ok      1234    launch package: nothing newer; ruv started", "started"},
-      {{}, {{"comparelocal", 21}}, "ok      1234    launch 2.31: copy script ran; ruv started", "started"},
+      {{"-b"}, {}, "ok", same, "nothing_newer"},
+      {{"-r", "x"}, {}, "ok", same, "nothing_newer"},
+      {{}, {}, "ok", same + " or declined", "nothing_newer"},
+      {{"-d", "b"}, {}, "ok", same + " or declined", "nothing_newer"},
+      {{"x\n-b y"}, {}, "ok", same + " or declined", "nothing_newer"},
+      {{"-d", "--show_stderr"},
+       {},
+       "problem",
+       "launch option -d has no value; ruv started or declined",
+       "nothing_newer"},
+      {{"--vmware-esxi", "h"}, {}, "ok", "launch package: not checked; ruv started", "not_checked"},
+      {{}, {{"comparelocal", 21}}, "ok", installed, "copy_script_ran"},
+      {{}, {{"comparelocal", 21}, {"expand", 52}}, "ok", installed, "copy_script_ran"},
+      {{"-b"},
+       {{"comparelocal", 21}, {"expand", 60}},
+       "problem",
+       "launch expand 60: Error, package corrupted o...; ruv started",
+       "expansion_failed"},
+      {{"-b"},
+       {{"comparelocal", 127}},
+       "problem",
+       "launch comparelocal 127: tavtool not found; ruv started",
+       "check_failed"},
+      {{"-b"},
+       {{"comparelocal", 126}},
+       "problem",
+       "launch comparelocal 126: tavtool cannot be e...; ruv started",
+       "check_failed"},
+      {{"-b"},
+       {{"comparelocal", 137}},
+       "problem",
+       "launch comparelocal 137: unknown exit code, ...; ruv started",
+       "check_failed"},
+      {{"-b"},
+       {{"comparelocal", 128}},
+       "problem",
+       "launch comparelocal 128: unknown exit code; ruv started",
+       "check_failed"},
+      {{"-b"}, {{"comparelocal", 52}}, "ok", same, "nothing_newer"},
+      {{"--chkupd"}, {}, "ok", "check  package: available; ruv not started", "available"},
+      {{"--chkupd"}, {{"compareweb", 30}}, "ok", "check  package: nothing newer; ruv not started", "nothing_newer"},
+      {{"--chkupd"}, {{"compareweb", 33}}, "ok", "check  package: nothing newer; ruv not started", "nothing_newer"},
+      {{"--update"}, {{"compareweb", 40}}, "ok", "check  package: nothing newer; ruv not started", "nothing_newer"},
       {{"--chkupd"},
        {{"compareweb", 42}},
-       "problem 1234    check  compareweb 42: Unable to connect to update website",
-       "not_started"},
+       "problem",
+       "check  compareweb 42: Unable to connect to update website",
+       "check_failed"},
+      {{"--chkupd"},
+       {{"compareweb", 21}},
+       "problem",
+       "check  compareweb 21: unexpected exit code; ruv not started",
+       "check_failed"},
+      {{"--chkupd"},
+       {{"compareweb", 61}},
+       "problem",
+       "check  compareweb 61: unexpected exit code; ruv not started",
+       "check_failed"},
+      {{"--update"},
+       {{"acquire", 31}},
+       "problem",
+       "update acquire 31: There's no update available for this s...",
+       "download_failed"},
+      {{"--update"}, {}, "ok", "update package: nothing newer; ruv not started", "nothing_newer"},
   };
   for (const Row& row : rows) {
+    SCOPED_TRACE(row.outcome);
     const Installation machine;
-    machine.CreateRepository();
+    ProvidePackage(machine);
     machine.InstallTool(row.tool, "Version=2.31\n");
-    machine.InstallCopyScript("echo copied");
     machine.Run(row.arguments);
-    EXPECT_THAT(Report(machine), HasSubstr("\n  1 " + row.line + "\n1 run: "));
-    EXPECT_EQ(json::parse(Report(machine, "--json")).at("ruv"), row.ruv);
+    const std::string verdict = row.verdict == "ok" ? "ok      " : "problem ";
+    EXPECT_THAT(Report(), AllOf(StartsWith(kHeader + "  1 " + verdict + "1234    " + row.outcome + "\n1 run: ")));
+    const json run = Runs().at(0);
+    EXPECT_EQ(run.at("verdict"), row.verdict);
+    EXPECT_EQ(run.at("reason").is_null(), row.verdict == "ok");
+    EXPECT_EQ(run.at("mode"), row.outcome.substr(0, row.outcome.find(' ')));
+    EXPECT_EQ(run.at("package"), row.package);
+    std::string ruv = row.outcome.substr(row.outcome.find("; ruv ") + 6);
+    std::replace(ruv.begin(), ruv.end(), ' ', '_');
+    EXPECT_EQ(run.at("ruv"), row.outcome.find("; ruv ") == std::string::npos ? "not_started" : ruv);
   }
+}
+
+TEST(RuvTrace, ReportsToolCalls) {
+  const Installation machine;
+  machine.Run({"--update", "--update_m", "5678"});
+  const json run = Runs().at(0);
+  const json& call = run.at("tool_calls").at(1);
+  EXPECT_EQ(run.at("machine_type"), "5678");
+  EXPECT_EQ(run.at("operating_system"), "rhel5");
+  EXPECT_EQ(run.at("architecture"), "64");
+  EXPECT_TRUE(run.at("command").is_null());
+  EXPECT_EQ(call.at("verb"), "acquire");
+  EXPECT_EQ(call.at("exit_code"), 0);
+  EXPECT_EQ(call.at("result"), "ok");
+  EXPECT_EQ(call.at("meaning"), "success");
+  EXPECT_FALSE(call.at("command_cut"));
+  EXPECT_THAT(call.at("command").get<std::string>(), EndsWith("--force --latest 2>/dev/null 1>/dev/null 2>&1"));
+  EXPECT_THAT(
+      machine.WithPlainDirectory(Report("--long")),
+      HasSubstr(
+          "      line 1 of /var/log/ZEM_Support/ruvtav.log, machine 5678 rhel5/64\n"
+          "      compareweb 0: update available\n"
+          "        \"@/tavtool\" compareweb -l \"@\" -m 5678 -o rhel5 -a 64 --latest 2>/dev/null 1>/dev/null 2>&1\n"
+          "      acquire 0: success\n"));
+}
+
+TEST(RuvTrace, ReportsCopyScripts) {
+  const std::pair<std::string, std::string> rows[] = {
+      {"exit 3", "ok      1234    launch 2.31: copy script ran; ruv started\n"},
+      {"rm \"$0\"", "ok      1234    launch 2.31: copy script ran; ruv started\n"},
+      {"printf '[TAVRUV]: [Status:]Return Code from tavtool = 9\\nno line feed'",
+       "ok      1234    launch 2.31: copy script ran; ruv started\n"},
+      {"echo \"sh: 1: $0: Permission denied\"; echo more",
+       "ok      1234    launch 2.31: copy script ran; ruv started\n"},
+  };
+  for (const auto& [script, line] : rows) {
+    const Installation machine;
+    ProvidePackage(machine, script);
+    machine.Run({"-b"});
+    EXPECT_THAT(Report(), HasSubstr("  1 " + line)) << script;
+  }
+  const Installation machine;
+  ProvidePackage(machine);
+  WriteFile(std::string(kExpansionDirectory) + "/ruv/data/copy.sh", "#!/no/such/shell\n");
+  machine.Run({"-b"});
+  EXPECT_THAT(Report(), HasSubstr("  1 problem 1234    launch copy script not run: not found; ruv started\n"));
+  EXPECT_EQ(Runs().at(0).at("package"), "copy_script_not_run");
+  fs::remove_all(kExpansionDirectory);
+  machine.Run({"-b"});
+  EXPECT_THAT(Report(), HasSubstr("  2 problem 1234    launch the package has no copy script; ruv started\n"));
+  EXPECT_EQ(Runs().at(1).at("package"), "no_copy_script");
+}
+
+TEST(RuvTrace, ReportsAPackageThatIsInstalledAgain) {
+  const Installation machine;
+  ProvidePackage(machine);
+  machine.Run({"-b"});
+  machine.Run({"--chkupd"});  // says nothing about the installed package
+  machine.Run({"-b"});
+  EXPECT_THAT(Report(), HasSubstr("  3 problem 1234    launch 2.31 installed again: the last instal...; ruv started\n"
+                                  "3 runs: 2 ok, 1 problem, 0 unknown\n"));
+  machine.InstallTool({});
+  machine.Run({"-b"});  // nothing newer: now it did take
+  machine.InstallTool({{"comparelocal", 21}}, "Version=2.31\n");
+  machine.Run({"-b"});
+  EXPECT_EQ(Runs().back().at("verdict"), "ok");
+}
+
+TEST(RuvTrace, CallsARunOkOnlyIfEachOfItsLinesIsInItsPlace) {
+  for (const auto& [arguments, portable] : kCompleteRuns) {
+    const Strings lines = Lines(TraceOf(arguments, portable));
+    ASSERT_EQ(RunsOf(Joined(lines)).at(0).at("verdict"), "ok");
+    for (std::size_t i = 0; i < lines.size(); ++i) {
+      // Not in every run: a command that makes a directory. While the copy script runs, any line may be its own.
+      if (lines[i].find("mkdir") != std::string::npos || lines[i] == "copied\n") continue;
+      const bool copies = lines[i].find("CopyTAVToRUVFoler: command") != std::string::npos;
+      SCOPED_TRACE(lines[i]);
+      Strings cut(lines.begin(), lines.begin() + static_cast<std::ptrdiff_t>(i) + 1);
+      Strings missing = lines;
+      missing.erase(missing.begin() + static_cast<std::ptrdiff_t>(i));
+      Strings twice = lines;
+      twice.insert(twice.begin() + static_cast<std::ptrdiff_t>(i), lines[i]);
+      Strings swapped = lines;
+      std::swap(swapped[i], swapped[(i + 1) % lines.size()]);
+      for (const Strings& trace : {cut, missing, copies ? missing : twice, copies ? missing : swapped}) {
+        if (trace == lines) continue;
+        const json last = RunsOf(Joined(trace)).back();
+        EXPECT_EQ(last.at("verdict"), "unknown");
+        EXPECT_NE(last.at("ruv"), "not_started");
+        EXPECT_TRUE(last.at("reason").is_string());
+      }
+    }
+  }
+}
+
+TEST(RuvTrace, SaysWhereARunWasLeft) {
+  const std::pair<std::string, std::string> rows[] = {
+      {"Entering TAVMaster::GetTAVBinaryPath", "?       ?      the launcher's directory was not found, or unfinished"},
+      {"TAVMaster: command = ", "?       ?      unfinished: in guihelper.sh"},
+      {"[Status:]MT = ", "1234    ?      unfinished: between two steps"},
+      {"Entering TAVMaster::ParseParameters", "1234    ?      help shown, or unfinished"},
+      {"Exiting TAVMaster::ParseParameters", "1234    ?      options rejected, or unfinished"},
+      {"CompareTAVPackage: TAVToolCmd", "1234    launch unfinished: in tavtool"},
+      {"CopyTAVToRUVFoler: command", "1234    launch unfinished: in the copy script"},
+      {"InvokeRUV: command", "1234    launch unfinished: in ruv or at the question before it"},
+  };
+  const std::string trace = TraceOf({"-b"}, false);
+  for (const auto& [line, expected] : rows) {
+    const std::size_t end = trace.find('\n', trace.find(line)) + 1;
+    const std::string cut = trace.substr(0, end);
+    EXPECT_THAT(ReportOf(cut), StartsWith(kHeader + "  1 unknown " + expected)) << line;
+    // The next run is whole, except where the one before may have gone on in its place.
+    const std::string next = Lines(ReportOf(cut + trace)).at(2);
+    const bool only_its_end_is_missing = line.find("InvokeRUV") == 0;
+    EXPECT_THAT(next, StartsWith(only_its_end_is_missing ? "  2 problem 1234    launch 2.31 installed again"
+                                 : line.find("Entering") == 0 || line.find("Exiting") == 0 ? "  2 ok "
+                                                                                           : "  2 unknown "));
+  }
+  const Installation machine;
+  machine.Run({"-h"});
+  machine.Run({"--update_m", "1"});
+  machine.Run({"-b"});
+  EXPECT_THAT(Report(), HasSubstr("3 runs: 1 ok, 0 problem, 2 unknown\n"));
+  fs::remove(kSystemInformationFile);
+  machine.Run({"-b"});
+  EXPECT_THAT(Report(), HasSubstr("  4 problem unknown launch machine unknown: no system information; ruv started\n"));
+}
+
+TEST(RuvTrace, ClaimsNothingFalseOfRunsAtTheSameTime) {
+  const Installation machine;
+  machine.CreateRepository();
+  machine.Install("tavtool",
+                  "for word; do case $word in -c*) sleep 0.0${word#-c}; exit ${word#-c} ;; esac; done\n"
+                  "[ $1 != comparelocal ] || sleep 0.02");
+  std::string all;
+  for (int i = 0; i < 30; ++i) {
+    const std::string number = std::to_string(i);
+    all += "sleep 0.02; \"$0\" -b -n" + number + " & \"$0\" --update -c" + number + " & ";
+  }
+  machine.Run({"-b", "-n99"}, Prelude("{ " + all + "wait; } >/dev/null"));
+  const std::vector<json> runs = Runs();
+  ASSERT_THAT(runs, SizeIs(61));
+  std::set<std::string> verdicts;
+  for (const json& run : runs) {
+    SCOPED_TRACE(run.dump());
+    verdicts.insert(run.at("verdict"));
+    if (run.at("command").is_string()) {
+      EXPECT_EQ(run.at("mode"), "launch");
+      EXPECT_THAT(run.at("ruv"), AnyOf("started", "unknown"));  // all of them have started it
+    }
+    for (const json& call : run.at("tool_calls")) {
+      const std::string command = call.at("command");
+      const std::size_t code = command.find(" -c");
+      if (code == std::string::npos || call.at("exit_code").is_null()) continue;
+      EXPECT_EQ(call.at("exit_code"), std::stoi(command.substr(code + 3)));
+    }
+  }
+  EXPECT_EQ(verdicts.count("unknown"), 1U);
+  EXPECT_EQ(runs.back().at("verdict"), "ok");
+}
+
+TEST(RuvTrace, HidesPasswords) {
+  const Installation machine;
+  machine.Run({"--chkupd", "--proxy-user=me", "--Proxy-Password=secret", "-v"});
+  for (const Strings& arguments :
+       {Strings{"-t", "me:secret@host/a@b"}, Strings{"-t", "me:secret secret@host", "-v"},
+        Strings{"--ipmi-lan", "me:secret@10.0.0.1:8"}, Strings{"--VMWARE-ESXI", "me:se:cret@h"},
+        Strings{"--remote-zfld", "me:secret-secret@h"}, Strings{"--proxy-password=secret secret", "-v"},
+        Strings{std::string(440, '-'), "--proxy-password=secretsecretsecretsecret"}}) {
+    machine.Run(arguments);
+  }
+  for (const char* option : {"", "--long", "--json", "--check", "--check --json"}) {
+    EXPECT_THAT(Report(option), Not(AnyOf(HasSubstr("secret"), HasSubstr("se:cret")))) << option;
+  }
+  for (const char* option : {"--long", "--json"})
+    EXPECT_THAT(Report(option + std::string(" --show-passwords")), HasSubstr("secret"));
+  EXPECT_THAT(Report("--long"),
+              AllOf(HasSubstr("--proxy-user=me --Proxy-Password=*** -v 2>/dev/null"),
+                    HasSubstr("-t \"me:***@b\" 2>/dev/null"), HasSubstr("--ipmi-lan \"me:***@10.0.0.1:8\""),
+                    HasSubstr("--remote-zfld me:***@h 2>/dev/null"), HasSubstr("--vmware-esxi \"me:***@h\"")));
+}
+
+TEST(RuvTrace, ShowsTextButNoControlCharacters) {
+  const Installation machine;
+  WriteFile(kSystemInformationFile, "ZEM_SYSTEM_MT=\xc3\xa4\xe2\x82\xac\x1b\xff\n");
+  machine.Run({"-b", "\xc3\xb6\x07\xc2\x9b\xe2\x80\xae\\\"\x7f\n\xfe"});
+  EXPECT_THAT(Report(), HasSubstr("  1 ok      \xc3\xa4\xe2\x82\xac\\u... launch"));
+  EXPECT_THAT(Report("--long"), HasSubstr("\"\xc3\xb6\\u0007\\u009b\\u202e\\\"\\u007f\\n\xef\xbf\xbd\" 2>/dev/null\n"));
+  EXPECT_EQ(Runs().at(0).at("machine_type"), "\xc3\xa4\xe2\x82\xac\x1b\xef\xbf\xbd");
+}
+
+TEST(RuvTrace, SurvivesDamage) {
+  std::string trace;
+  for (const auto& [arguments, portable] : kCompleteRuns) trace += TraceOf(arguments, portable);
+  for (unsigned seed = 1; seed <= 60; ++seed) {
+    SCOPED_TRACE(seed);
+    std::mt19937 random(seed);
+    const auto below = [&](std::size_t limit) { return static_cast<std::size_t>(random()) % limit; };
+    std::string damaged = trace;
+    for (int i = 0; i < 5; ++i) {
+      damaged[below(damaged.size())] = static_cast<char>(below(256));
+      damaged.erase(below(damaged.size()), below(60));
+      damaged.insert(below(damaged.size()), damaged.substr(below(damaged.size()), below(400)));
+    }
+    for (const json& run : RunsOf(damaged)) EXPECT_THAT(run.at("verdict"), AnyOf("ok", "problem", "unknown"));
+    for (const std::string& line : Lines(Report() + Report("--long"))) {
+      EXPECT_THAT(line, Not(::testing::ContainsRegex("[\x01-\x09\x0b-\x1f\x7f]")));
+      if (line.substr(0, 6) != "      ") EXPECT_LE(line.size(), 80U + 1);
+    }
+  }
+}
+
+TEST(RuvTrace, JudgesTheLastRun) {
+  const Installation machine;
+  const std::string ok = TraceOf({"-b"}, false);
+  const std::string cut = ok.substr(0, ok.rfind("[TAVRUV]"));
+  EXPECT_EQ(ReportOf(ok, "--check"), "ok: 2.31: copy script ran; ruv started (run 1)\n");
+  EXPECT_EQ(ReportOf(ok + ok, "--check"),
+            "problem: 2.31 installed again: the last installation did not take; "
+            "ruv started (run 2)\nstatus 1");
+  EXPECT_THAT(ReportOf(cut, "--check"),
+              AllOf(StartsWith("unknown: unfinished: between two steps"), EndsWith("status 2")));
+  EXPECT_EQ(ReportOf("text\n", "--check"),
+            std::string("ruv-trace: no run of the launcher in ") + kTraceFile + "\nstatus 3");
+  EXPECT_EQ(ReportOf(ok + ok, "--problems"),
+            kHeader +
+                "  2 problem 1234    launch 2.31 installed again: the last instal...; ruv started\n"
+                "2 runs: 1 ok, 1 problem, 0 unknown\n");
+  EXPECT_THAT(ReportOf(ok, "--problems"), EndsWith("1 run: 1 ok, 0 problem, 0 unknown\n"));
+}
+
+TEST(RuvTrace, ReadsFilesInTheirOrder) {
+  const Installation machine;
+  const std::string trace = TraceOf({"-b"}, false);
+  const std::string half = trace.substr(0, trace.find("[TAVRUV]: [Debug:] Entering TAVMaster::InvokeRUV"));
+  WriteFile("/tmp/old", half);
+  WriteFile("/tmp/new", trace.substr(half.size()));
+  EXPECT_THAT(Report("/tmp/old /tmp/new"), EndsWith("\n1 run: 1 ok, 0 problem, 0 unknown\n"));
+  EXPECT_THAT(Report("- </tmp/old"), EndsWith("\n1 run: 0 ok, 0 problem, 1 unknown\n"));
+  EXPECT_EQ(Runs("/tmp/old /tmp/new").at(0).at("file"), "/tmp/old");
+  EXPECT_EQ(ReportOf("x\n" + trace, "--check --json | grep -c '\"line\":2,'"), "1\n");
+  std::system("gzip -kf /tmp/old");
+  EXPECT_THAT(Report("/tmp/old.gz"), AllOf(HasSubstr("/tmp/old.gz is compressed: use zcat"), EndsWith("status 1")));
+  EXPECT_THAT(Report("/etc/passwd"), AllOf(HasSubstr("no run of the launcher in /etc/passwd"), EndsWith("status 1")));
+  EXPECT_THAT(Report("/tmp/none"), EndsWith("cannot read /tmp/none: No such file or directory\nstatus 1"));
+  EXPECT_THAT(Report("/tmp"), EndsWith("cannot read /tmp: Is a directory\nstatus 1"));
+  EXPECT_THAT(ReportOf(trace, ">/dev/full"), EndsWith("cannot write: No space left on device\nstatus 1"));
+  // A line without an end, longer than every buffer, hides nothing after it.
+  EXPECT_THAT(ReportOf(std::string(3'000'000, 'x') + "\n" + trace), EndsWith("\n1 run: 1 ok, 0 problem, 0 unknown\n"));
+}
+
+TEST(RuvTrace, ExplainsItself) {
+  const std::string help = Report("--help");
+  EXPECT_EQ(help, Report("-h"));
+  EXPECT_THAT(help, StartsWith("Usage: ruv-trace [OPTION]... [FILE]...\n"));
+  EXPECT_THAT(Lines(help), AllOf(SizeIs(::testing::Le(16U)), Each(SizeIs(::testing::Le(81U)))));
+  EXPECT_THAT(Report("--version"), MatchesRegex("ruv-trace [0-9]+\\.[0-9]+\\.[0-9]+\n"));
+  EXPECT_THAT(Report("--no-such-option"), EndsWith("Try ruv-trace --help.\nstatus 64"));
 }

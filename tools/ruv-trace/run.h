@@ -72,6 +72,8 @@ class Run {
   bool IsDoubtful() const { return certain_.has_value(); }
   bool Finished() const;
   bool RunsCopyScript() const;
+  // Whether the application runs, or the question before it is open.
+  bool RunsApplication() const;
   // Whether the launcher can end here without a message: after the help text, with rejected options, and without its
   // own directory.
   bool MayHaveEnded() const;

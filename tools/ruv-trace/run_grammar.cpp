@@ -226,6 +226,8 @@ bool Run::Finished() const { return state_ == kEnd; }
 
 bool Run::RunsCopyScript() const { return state_ == kRunningCopyScript; }
 
+bool Run::RunsApplication() const { return state_ == kRunningApplication && !IsMixed(); }
+
 bool Run::MayHaveEnded() const { return state_ == kOwnDirectory || state_ == kOptions || state_ == kOptionsLeft; }
 
 bool Run::Knows(std::string_view message) {

@@ -57,7 +57,8 @@ void TraceReader::BeginRun() {
   } else if (run_) {
     // Where both of two runs were left is not remembered.
     if (left_ || run_->IsDoubtful()) run_->Doubt(kMixed);
-    left_ = run_;
+    // The lines after the application's end are the same in all runs: nothing of the next run can be taken for them.
+    if (!run_->RunsApplication()) left_ = run_;
     in_turn_ = 0;
   }
   if (run_) Hold();
@@ -114,7 +115,8 @@ void TraceReader::Hold() {
 void TraceReader::ReportFirst() {
   Run& run = held_.front();
   const Facts& known = run.Known();
-  if (!known.copy_command.text.empty() && !known.copy_command.MayBeCut()) {
+  const bool installed = known.package == kCopyScriptRan || known.package == kCopyScriptNotRun;
+  if (installed && !known.copy_command.MayBeCut()) {
     run.installed_again = known.copy_command.text == installed_ && !known.package_version.empty();
     installed_ = known.copy_command.text;
   } else if (known.package == kNothingNewer) {
