@@ -1,7 +1,6 @@
 // ruv-trace: summarises the trace of the launcher.
 #include <getopt.h>
 
-#include <array>
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
@@ -105,7 +104,7 @@ bool ReadFiles(const std::vector<std::string>& names, TraceReader& reader) {
   for (const std::string& name : names) {
     InputFile file(name);
     reader.BeginFile(name);
-    for (std::string_view line; file.Next(line);) reader.TakeLine(line);
+    for (std::string line; file.Next(line);) reader.TakeLine(line);
     const std::string refusal = file.Refusal(reader.FoundRuns());
     if (refusal.empty()) continue;
     Complain(refusal);
@@ -132,40 +131,37 @@ ExitStatus Summarise(const Options& options, const std::vector<std::string>& nam
 }  // namespace
 
 int main(int argc, char** argv) {
-  Options options;
-  struct Flag {
-    const char* name;
-    bool Options::*value;
-  };
-  static constexpr Flag kFlags[] = {{"json", &Options::json},
-                                    {"long", &Options::with_details},
-                                    {"problems", &Options::problems_only},
-                                    {"check", &Options::check},
-                                    {"show-passwords", &Options::show_passwords}};
-  enum : int { kHelpOption = 'h', kVersion = 'V', kFirstFlag = 256 };
-  std::vector<option> long_options = {{"help", no_argument, nullptr, kHelpOption},
-                                      {"version", no_argument, nullptr, kVersion}};
-  int letter = kFirstFlag;
-  for (const Flag& flag : kFlags) long_options.push_back({flag.name, no_argument, nullptr, letter++});
-  long_options.push_back({});
+  int json = 0;
+  int with_details = 0;
+  int problems_only = 0;
+  int check = 0;
+  int show_passwords = 0;
+  const option long_options[] = {{"json", no_argument, &json, 1},
+                                 {"long", no_argument, &with_details, 1},
+                                 {"problems", no_argument, &problems_only, 1},
+                                 {"check", no_argument, &check, 1},
+                                 {"show-passwords", no_argument, &show_passwords, 1},
+                                 {"help", no_argument, nullptr, 'h'},
+                                 {"version", no_argument, nullptr, 'V'},
+                                 {}};
   const std::string default_file = std::string(NZEMRUVTAV::kLogDirectory) + "/" + NZEMRUVTAV::kLogFile;
 
-  while ((letter = getopt_long(argc, argv, "h", long_options.data(), nullptr)) != -1) {
+  for (int letter = 0; (letter = getopt_long(argc, argv, "h", long_options, nullptr)) != -1;) {
     switch (letter) {
-      case kHelpOption:
+      case 0:
+        break;
+      case 'h':
         std::printf(kHelp, default_file.c_str());
         return EXIT_SUCCESS;
-      case kVersion:
+      case 'V':
         std::puts("ruv-trace " RUV_VERSION);
         return EXIT_SUCCESS;
-      case '?':
+      default:
         std::fputs("Try ruv-trace --help.\n", stderr);
         return kUsageError;
-      default:
-        options.*kFlags[letter - kFirstFlag].value = true;
     }
   }
   std::vector<std::string> names(argv + optind, argv + argc);
   if (names.empty()) names.push_back(default_file);
-  return Summarise(options, names);
+  return Summarise({json != 0, with_details != 0, problems_only != 0, check != 0, show_passwords != 0}, names);
 }

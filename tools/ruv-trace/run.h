@@ -40,7 +40,10 @@ struct Facts {
   std::string_view package = kUnknown;  // what became of it
   std::string package_version;          // empty if not in the trace
   Command copy_command;                 // of the package's copy script
+  unsigned long copy_output_lines = 0;  // of the copy script
   std::string shell_complaint;          // why the shell could not run the copy script
+  bool portable = false;                // the installation
+  bool no_question = false;             // the user was not asked whether to go on
   Command command;                      // of the application
   std::string_view application = kUnknown;
   std::string option_without_value;
@@ -57,7 +60,6 @@ class Run {
   unsigned long line;
   bool installed_again = false;    // the package that the last installation had installed
   bool others_unfinished = false;  // when it began
-  unsigned long run_before = 0;    // the number of the unfinished run whose lines may be among this one's, or 0
 
   // Takes a message of the trace. Returns false if no launcher writes it at this point of a run.
   bool Take(std::string_view message);
@@ -69,7 +71,8 @@ class Run {
   void Doubt(std::string_view reason);
 
   bool IsMixed() const { return !doubt_.empty(); }
-  bool IsDoubtful() const { return certain_.has_value(); }
+  // Whether later lines may be those of an unfinished run.
+  bool IsDoubtful() const { return frozen_; }
   bool Finished() const;
   bool RunsCopyScript() const;
   // Whether the application runs, or the question before it is open.
@@ -79,7 +82,7 @@ class Run {
   bool MayHaveEnded() const;
 
   // Returns what is certain.
-  const Facts& Known() const { return certain_ ? *certain_ : facts_; }
+  const Facts& Known() const { return facts_; }
   // Returns the identity on the package tool's command line or, without one, the discovered one.
   Identity Machine() const;
   // Returns what failed, or "" if nothing is known to have failed.
@@ -93,45 +96,31 @@ class Run {
   static bool Closes(std::string_view message);
 
  private:
-  enum State : unsigned char;
-  struct Transition;
-  static const Transition kTransitions[];
+  struct Message;
+  static const Message kMessages[];
 
-  bool IsNext(const Transition& transition, std::string_view message) const;
+  // Ids of messages.
+  static constexpr char kOwnDirectory = 'B';
+  static constexpr char kHelper = 'D';
+  static constexpr char kOptions = 'Q';
+  static constexpr char kUnknownOption = 'R';
+  static constexpr char kOptionsLeft = 'S';
+  static constexpr char kCopyScript = 'o';
+  static constexpr char kApplication = 'y';
+  static constexpr char kEnd = '5';
 
-  // Take the rest of a message. Return false if it cannot be the launcher's.
-  bool TakeSystem(std::string_view text);
-  bool TakeMachineType(std::string_view text);
-  bool TakeArchitecture(std::string_view text);
-  bool TakeCheck(std::string_view text);
-  bool TakeDownload(std::string_view text);
-  bool TakeLaunch(std::string_view text);
-  bool TakeRemoteLaunch(std::string_view text);
-  bool TakeToolCommand(const std::string& verb, std::string_view text);
-  template <const std::string& verb>
-  bool TakeCommandOf(std::string_view text) {
-    return TakeToolCommand(verb, text);
-  }
-  bool TakeExitCode(std::string_view text);
-  bool TakeNoCopyScript(std::string_view text);
-  bool TakeCopyCommand(std::string_view text);
-  bool TakeCopyEnd(std::string_view text);
-  bool TakeMissingValue(std::string_view text);
-  bool TakeCommand(std::string_view text);
-  bool TakeEnd(std::string_view text);
+  // Returns the id of the last message, or 0.
+  char Last() const;
+  const Message* Next(std::string_view message) const;
+  bool TakeExitCode(std::string_view message);
 
-  // Returns where the run was when its trace ended.
-  std::string_view Unfinished() const;
-
-  State state_ = {};
-  int result_ = 0;                  // of the last tool call
-  std::string_view message_due_;    // the message of a known exit code, which must come next
-  std::size_t room_ = 0;            // bytes that the last message could have been longer
-  unsigned long output_lines_ = 0;  // of the copy script
-  bool no_question_ = false;        // the user was not asked whether to go on
+  const Message* last_ = nullptr;
+  bool awaits_exit_code_ = false;  // of the package tool
+  std::string_view error_text_due_;
+  const Message* doubtful_after_ = nullptr;
+  unsigned long run_before_ = 0;  // the unfinished one
+  bool frozen_ = false;           // nothing more is certain
   Facts facts_;
-  std::optional<State> doubtful_after_;
-  std::optional<Facts> certain_;  // what was certain before the doubt
   std::string_view doubt_;
 };
 

@@ -27,21 +27,6 @@ const Verb& VerbOf(const ToolCall& call) {
   return *std::find_if(std::begin(kVerbs), std::end(kVerbs), [&](const Verb& verb) { return verb.name == call.verb; });
 }
 
-// Exit codes that the launcher's table has no message for: those of the shell, and of a shell that was not started.
-constexpr NZEMRUVTAV::ErrMsg kNotRun[] = {
-    {-1, "no shell could be started"},
-    {126, "tavtool cannot be executed"},
-    {127, "tavtool not found"},
-};
-
-template <std::size_t size>
-std::string_view MessageOf(int exit_code, const NZEMRUVTAV::ErrMsg (&messages)[size]) {
-  for (const NZEMRUVTAV::ErrMsg& known : messages) {
-    if (known.exit_code == exit_code) return known.message;
-  }
-  return "";
-}
-
 // Removes everything up to and including the mark and returns the part before it. Returns nullopt if there is no mark.
 std::optional<std::string> TakeUntil(std::string_view& text, std::string_view mark) {
   const std::size_t position = text.find(mark);
@@ -51,20 +36,29 @@ std::optional<std::string> TakeUntil(std::string_view& text, std::string_view ma
   return before;
 }
 
-}  // namespace
-
-int ToolCall::Result() const {
+// Returns what the launcher makes of an exit code: one of the results in exit_code_tables.h.
+int ResultOf(int exit_code) {
   for (const NZEMRUVTAV::ToolResult& known : NZEMRUVTAV::kToolResults) {
     if (known.exit_code == exit_code) return known.result;
   }
   return NZEMRUVTAV::kFailure;
 }
 
+}  // namespace
+
+std::string_view ErrorText(int exit_code) {
+  for (const NZEMRUVTAV::ErrMsg& known : NZEMRUVTAV::ErrMsgs) {
+    const std::string_view message = known.message;
+    if (known.exit_code == exit_code) return message.substr(0, message.find('\n'));
+  }
+  return "";
+}
+
 bool ToolCall::Failed() const {
   if (!exit_code) return false;
   const bool in_repository = verb == NZEMRUVTAV::TAVTOOL_CMD_COMPLOC;
   const bool installs = verb == NZEMRUVTAV::TAVTOOL_CMD_ACQUIRE || verb == NZEMRUVTAV::TAVTOOL_CMD_EXPAND;
-  switch (Result()) {
+  switch (ResultOf(*exit_code)) {
     case NZEMRUVTAV::kSuccess:
       return false;
     case NZEMRUVTAV::kPackageToInstall:
@@ -78,7 +72,7 @@ bool ToolCall::Failed() const {
 
 std::string_view ToolCall::Meaning() const {
   if (!exit_code) return "no exit code";
-  switch (Result()) {
+  switch (ResultOf(*exit_code)) {
     case NZEMRUVTAV::kSuccess:
       return VerbOf(*this).success;
     case NZEMRUVTAV::kPackageToInstall:
@@ -88,17 +82,23 @@ std::string_view ToolCall::Meaning() const {
     default:
       break;
   }
-  std::string_view message = MessageOf(*exit_code, NZEMRUVTAV::ErrMsgs);
-  message = message.substr(0, message.find('\n'));
-  if (!message.empty()) return message.substr(0, message.find_last_not_of('.') + 1);
-  message = MessageOf(*exit_code, kNotRun);
-  if (!message.empty()) return message;
-  return *exit_code > 128 ? "unknown exit code, or ended by a signal" : "unknown exit code";
+  const std::string_view text = ErrorText(*exit_code);
+  if (!text.empty()) return text.substr(0, text.find_last_not_of('.') + 1);
+  switch (*exit_code) {
+    case -1:
+      return "no shell could be started";
+    case 126:
+      return "tavtool cannot be executed";
+    case 127:
+      return "tavtool not found";
+    default:
+      return *exit_code > 128 ? "unknown exit code, or ended by a signal" : "unknown exit code";
+  }
 }
 
 std::string_view ToolCall::Package() const {
   if (Failed()) return VerbOf(*this).package_after_failure;
-  const int result = Result();
+  const int result = ResultOf(*exit_code);
   if (result == NZEMRUVTAV::kPackageToInstall) return kAvailable;
   if (result == NZEMRUVTAV::kFailure) return verb == NZEMRUVTAV::TAVTOOL_CMD_COPY ? "" : kNothingNewer;
   return VerbOf(*this).package_after_success;

@@ -32,18 +32,19 @@ inline constexpr std::string_view kDownloadFailed = "download_failed";
 inline constexpr std::string_view kExpanded = "expanded";
 inline constexpr std::string_view kExpansionFailed = "expansion_failed";
 
+// Returns the first line of the launcher's message for an exit code, or "" if there is none.
+std::string_view ErrorText(int exit_code);
+
 struct ToolCall {
   std::string verb;
   Command command;
   std::optional<int> exit_code = {};  // empty if not in the trace
 
-  // Returns what the launcher makes of the exit code: one of the results in exit_code_tables.h.
-  int Result() const;
   // True if the code says that something went wrong. That there is no newer package is not wrong.
   bool Failed() const;
   // Returns the exit code's meaning in words.
   std::string_view Meaning() const;
-  // Returns what became of the package, or "" if the call does not change that.
+  // Returns what became of the package, or "" if the call does not change that. There must be an exit code.
   std::string_view Package() const;
   // Sets the values that the command gives for the machine.
   void ReadIdentity(Identity& identity) const;

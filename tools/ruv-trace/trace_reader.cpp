@@ -81,7 +81,6 @@ void TraceReader::EndRun() {
 
 // Takes a message that is not the next one of the run: it is another run's, or some are missing before it.
 void TraceReader::TakeOutOfTurn(std::string_view message) {
-  const bool explained = run_ && (left_ || after_silent_end_ || run_->IsMixed());
   if (run_) {
     if (!run_->IsMixed() && after_silent_end_) ++unfinished_;  // the run before had not ended after all
     run_->Doubt(kMixed);
@@ -95,8 +94,8 @@ void TraceReader::TakeOutOfTurn(std::string_view message) {
   }
   found_runs_ = true;
   in_turn_ = 0;
-  // The runs since an unfinished one may have ended with its lines. Lines that say nothing can be theirs as well.
-  if (!explained && !Run::Closes(message)) {
+  // The runs since an unfinished one may have ended with its lines, and this may be their own.
+  if (!Run::Closes(message)) {
     for (Run& each : held_) {
       if (each.others_unfinished) each.Doubt(kMixed);
     }
