@@ -228,6 +228,6 @@ bool Run::Closes(std::string_view message) {
                      [&](const Message& each) { return each.Is(message); });
 }
 
-char Run::Last() const { return last_ == nullptr ? 0 : last_->id; }
+char Run::Last() const { return last_ == nullptr ? '\0' : last_->id; }
 
 }  // namespace ruv_trace

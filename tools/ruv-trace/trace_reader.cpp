@@ -51,10 +51,9 @@ bool TraceReader::TakeMessage(std::string_view message) {
 
 void TraceReader::BeginRun() {
   const bool others_unfinished = unfinished_ > 0;
-  after_silent_end_ = run_ && run_->MayHaveEnded() && !run_->IsMixed();
-  if (after_silent_end_) {
-    --unfinished_;
-  } else if (run_) {
+  const bool silent_end = run_ && run_->MayHaveEnded() && !run_->IsMixed();
+  silent_ends_ = silent_end ? silent_ends_ + 1 : 0;
+  if (run_ && !silent_end) {
     // Where both of two runs were left is not remembered.
     if (left_ || run_->IsDoubtful()) run_->Doubt(kMixed);
     // The lines after the application's end are the same in all runs: nothing of the next run can be taken for them.
@@ -70,7 +69,8 @@ void TraceReader::BeginRun() {
 }
 
 void TraceReader::EndRun() {
-  --unfinished_;
+  unfinished_ -= 1 + silent_ends_;
+  silent_ends_ = 0;
   if (run_->IsDoubtful()) left_.reset();
   if (++in_turn_ == kMostHeld) {
     left_.reset();
@@ -82,7 +82,6 @@ void TraceReader::EndRun() {
 // Takes a message that is not the next one of the run: it is another run's, or some are missing before it.
 void TraceReader::TakeOutOfTurn(std::string_view message) {
   if (run_) {
-    if (!run_->IsMixed() && after_silent_end_) ++unfinished_;  // the run before had not ended after all
     run_->Doubt(kMixed);
   } else {
     if (!Run::Knows(message)) return;

@@ -53,7 +53,7 @@ class TraceReader {
   unsigned long runs_ = 0;
   std::optional<Run> run_;         // the last one that began, until it ends
   std::optional<Run> left_;        // an unfinished one whose lines may be among those of the next
-  bool after_silent_end_ = false;  // run_ began where the one before may have ended without a message
+  unsigned long silent_ends_ = 0;  // runs just before run_ that may have ended without a message
   std::deque<Run> held_;           // the runs before run_, not reported yet
   unsigned long unfinished_ = 0;   // runs that may still go on, run_ included
   std::size_t in_turn_ = 0;        // runs that came to their end since a line was last out of turn
