@@ -83,103 +83,79 @@ std::string TraceOf(const Strings& arguments, bool portable) {
   return ReadFile(kTraceFile);
 }
 
+// Together they have every message.
 const std::vector<std::pair<Strings, bool>> kCompleteRuns = {
-    {{"-b"}, false}, {{"-b"}, true}, {{"--update"}, false}, {{"--update"}, true}, {{"--ipmi-lan"}, false}};
+    {{"-b"}, true}, {{"--update"}, false}, {{"--ipmi-lan"}, false}};
 
 }  // namespace
 
+// Checks what is reported of a run. The package is that of the JSON output; the line is that of the listing without the
+// run's number and machine, with single blanks.
+void ExpectReport(const Strings& arguments, const std::map<std::string, int>& tool_codes, const std::string& package,
+                  const std::string& line) {
+  SCOPED_TRACE(line);
+  const Installation machine;
+  ProvidePackage(machine);
+  machine.InstallTool(tool_codes, "Version=2.31\n");
+  machine.Run(arguments);
+  const json run = Runs().at(0);
+  const std::string verdict = run.at("verdict");
+  const std::string mode = run.at("mode");
+  const std::string outcome = line.substr(verdict.size() + mode.size() + 2);
+  EXPECT_EQ(verdict + " " + mode + " " + outcome, line);
+  EXPECT_EQ(run.at("reason").is_null(), verdict == "ok");
+  EXPECT_EQ(run.at("package"), package);
+  std::string ruv = outcome.substr(outcome.find("; ruv ") + 6);
+  std::replace(ruv.begin(), ruv.end(), ' ', '_');
+  EXPECT_EQ(run.at("ruv"), outcome.find("; ruv ") == std::string::npos ? "not_started" : ruv);
+  const std::string columns = "  1 " + (verdict + "       ").substr(0, 8) + "1234    " + (mode + "  ").substr(0, 7);
+  EXPECT_THAT(Report(), StartsWith(kHeader + columns + outcome + "\n1 run: "));
+}
+
 TEST(RuvTrace, ReportsWhatARunDid) {
+  const std::string same = "ok launch package: nothing newer; ruv started";
+  const std::string installed = "ok launch 2.31: copy script ran; ruv started";
+  const std::string nothing = "ok check package: nothing newer; ruv not started";
+  ExpectReport({"-b"}, {}, "nothing_newer", same);
+  ExpectReport({"-r", "x"}, {}, "nothing_newer", same);
+  ExpectReport({}, {}, "nothing_newer", same + " or declined");
+  ExpectReport({"-d", "b"}, {}, "nothing_newer", same + " or declined");
+  ExpectReport({"x\n-b y"}, {}, "nothing_newer", same + " or declined");
+  ExpectReport({"-d", "--show_stderr"}, {}, "nothing_newer",
+               "problem launch option -d has no value; ruv started or declined");
+  ExpectReport({"--vmware-esxi", "h"}, {}, "not_checked", "ok launch package: not checked; ruv started");
+  ExpectReport({}, {{"comparelocal", 21}}, "copy_script_ran", installed);
+  ExpectReport({}, {{"comparelocal", 21}, {"expand", 52}}, "copy_script_ran", installed);
+  ExpectReport({"-b"}, {{"comparelocal", 52}}, "nothing_newer", same);
+  ExpectReport({"--chkupd"}, {}, "available", "ok check package: available; ruv not started");
+  ExpectReport({"--chkupd"}, {{"compareweb", 30}}, "nothing_newer", nothing);
+  ExpectReport({"--chkupd"}, {{"compareweb", 33}}, "nothing_newer", nothing);
+  ExpectReport({"--update"}, {{"compareweb", 40}}, "nothing_newer", nothing);
+  ExpectReport({"--update"}, {}, "nothing_newer", "ok update package: nothing newer; ruv not started");
+}
+
+TEST(RuvTrace, ReportsFailedToolCalls) {
   struct Row {
-    Strings arguments;
-    std::map<std::string, int> tool;  // its exit codes
-    std::string verdict;
-    std::string outcome;
-    std::string package;  // in JSON
+    std::string argument;
+    std::string verb;
+    int exit_code;
+    std::string package;
+    std::string meaning;
   };
-  const std::string same = "launch package: nothing newer; ruv started";
-  const std::string installed = "launch 2.31: copy script ran; ruv started";
-  const Row rows[] = {
-      {{"-b"}, {}, "ok", same, "nothing_newer"},
-      {{"-r", "x"}, {}, "ok", same, "nothing_newer"},
-      {{}, {}, "ok", same + " or declined", "nothing_newer"},
-      {{"-d", "b"}, {}, "ok", same + " or declined", "nothing_newer"},
-      {{"x\n-b y"}, {}, "ok", same + " or declined", "nothing_newer"},
-      {{"-d", "--show_stderr"},
-       {},
-       "problem",
-       "launch option -d has no value; ruv started or declined",
-       "nothing_newer"},
-      {{"--vmware-esxi", "h"}, {}, "ok", "launch package: not checked; ruv started", "not_checked"},
-      {{}, {{"comparelocal", 21}}, "ok", installed, "copy_script_ran"},
-      {{}, {{"comparelocal", 21}, {"expand", 52}}, "ok", installed, "copy_script_ran"},
-      {{"-b"},
-       {{"comparelocal", 21}, {"expand", 60}},
-       "problem",
-       "launch expand 60: Error, package corrupted o...; ruv started",
-       "expansion_failed"},
-      {{"-b"},
-       {{"comparelocal", 127}},
-       "problem",
-       "launch comparelocal 127: tavtool not found; ruv started",
-       "check_failed"},
-      {{"-b"},
-       {{"comparelocal", 126}},
-       "problem",
-       "launch comparelocal 126: tavtool cannot be e...; ruv started",
-       "check_failed"},
-      {{"-b"},
-       {{"comparelocal", 137}},
-       "problem",
-       "launch comparelocal 137: unknown exit code, ...; ruv started",
-       "check_failed"},
-      {{"-b"},
-       {{"comparelocal", 128}},
-       "problem",
-       "launch comparelocal 128: unknown exit code; ruv started",
-       "check_failed"},
-      {{"-b"}, {{"comparelocal", 52}}, "ok", same, "nothing_newer"},
-      {{"--chkupd"}, {}, "ok", "check  package: available; ruv not started", "available"},
-      {{"--chkupd"}, {{"compareweb", 30}}, "ok", "check  package: nothing newer; ruv not started", "nothing_newer"},
-      {{"--chkupd"}, {{"compareweb", 33}}, "ok", "check  package: nothing newer; ruv not started", "nothing_newer"},
-      {{"--update"}, {{"compareweb", 40}}, "ok", "check  package: nothing newer; ruv not started", "nothing_newer"},
-      {{"--chkupd"},
-       {{"compareweb", 42}},
-       "problem",
-       "check  compareweb 42: Unable to connect to update website",
-       "check_failed"},
-      {{"--chkupd"},
-       {{"compareweb", 21}},
-       "problem",
-       "check  compareweb 21: unexpected exit code; ruv not started",
-       "check_failed"},
-      {{"--chkupd"},
-       {{"compareweb", 61}},
-       "problem",
-       "check  compareweb 61: unexpected exit code; ruv not started",
-       "check_failed"},
-      {{"--update"},
-       {{"acquire", 31}},
-       "problem",
-       "update acquire 31: There's no update available for this s...",
-       "download_failed"},
-      {{"--update"}, {}, "ok", "update package: nothing newer; ruv not started", "nothing_newer"},
-  };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(row.outcome);
-    const Installation machine;
-    ProvidePackage(machine);
-    machine.InstallTool(row.tool, "Version=2.31\n");
-    machine.Run(row.arguments);
-    const std::string verdict = row.verdict == "ok" ? "ok      " : "problem ";
-    EXPECT_THAT(Report(), AllOf(StartsWith(kHeader + "  1 " + verdict + "1234    " + row.outcome + "\n1 run: ")));
-    const json run = Runs().at(0);
-    EXPECT_EQ(run.at("verdict"), row.verdict);
-    EXPECT_EQ(run.at("reason").is_null(), row.verdict == "ok");
-    EXPECT_EQ(run.at("mode"), row.outcome.substr(0, row.outcome.find(' ')));
-    EXPECT_EQ(run.at("package"), row.package);
-    std::string ruv = row.outcome.substr(row.outcome.find("; ruv ") + 6);
-    std::replace(ruv.begin(), ruv.end(), ' ', '_');
-    EXPECT_EQ(run.at("ruv"), row.outcome.find("; ruv ") == std::string::npos ? "not_started" : ruv);
+  for (const Row& row : std::initializer_list<Row>{
+           {"-b", "expand", 60, "expansion_failed", "Error, package corrupted o...; ruv started"},
+           {"-b", "comparelocal", 127, "check_failed", "tavtool not found; ruv started"},
+           {"-b", "comparelocal", 126, "check_failed", "tavtool cannot be e...; ruv started"},
+           {"-b", "comparelocal", 137, "check_failed", "unknown exit code, ...; ruv started"},
+           {"-b", "comparelocal", 128, "check_failed", "unknown exit code; ruv started"},
+           {"--chkupd", "compareweb", 42, "check_failed", "Unable to connect to update website"},
+           {"--chkupd", "compareweb", 21, "check_failed", "unexpected exit code; ruv not started"},
+           {"--chkupd", "compareweb", 61, "check_failed", "unexpected exit code; ruv not started"},
+           {"--update", "acquire", 31, "download_failed", "There's no update available for this s..."}}) {
+    const std::string mode = row.argument == "-b" ? "launch" : row.argument == "--update" ? "update" : "check";
+    const int comparelocal = row.verb == "comparelocal" ? row.exit_code : 21;
+    ExpectReport({row.argument}, {{"comparelocal", comparelocal}, {row.verb, row.exit_code}}, row.package,
+                 "problem " + mode + " " + row.verb + " " + std::to_string(row.exit_code) + ": " + row.meaning);
   }
 }
 
@@ -466,14 +442,16 @@ TEST(RuvTrace, ReadsFilesInTheirOrder) {
   const Installation machine;
   const std::string trace = TraceOf({"-b"}, false);
   const std::string half = trace.substr(0, trace.find("[TAVRUV]: [Debug:] Entering TAVMaster::InvokeRUV"));
-  WriteFile("/tmp/old", half);
-  WriteFile("/tmp/new", trace.substr(half.size()));
-  EXPECT_THAT(Report("/tmp/old /tmp/new"), EndsWith("\n1 run: 1 ok, 0 problem, 0 unknown\n"));
-  EXPECT_THAT(Report("- </tmp/old"), EndsWith("\n1 run: 0 ok, 0 problem, 1 unknown\n"));
-  EXPECT_EQ(Runs("/tmp/old /tmp/new").at(0).at("file"), "/tmp/old");
+  const std::string old_file = machine.Directory() + "/old";
+  const std::string both = old_file + " " + machine.Directory() + "/new";
+  WriteFile(old_file, half);
+  WriteFile(machine.Directory() + "/new", trace.substr(half.size()));
+  EXPECT_THAT(Report(both), EndsWith("\n1 run: 1 ok, 0 problem, 0 unknown\n"));
+  EXPECT_THAT(Report("- <" + old_file), EndsWith("\n1 run: 0 ok, 0 problem, 1 unknown\n"));
+  EXPECT_EQ(Runs(both).at(0).at("file"), old_file);
   EXPECT_EQ(ReportOf("x\n" + trace, "--check --json | grep -c '\"line\":2,'"), "1\n");
-  std::system("gzip -kf /tmp/old");
-  EXPECT_THAT(Report("/tmp/old.gz"), AllOf(HasSubstr("/tmp/old.gz is compressed: use zcat"), EndsWith("status 1")));
+  std::system(("gzip " + old_file).c_str());
+  EXPECT_THAT(Report(old_file + ".gz"), AllOf(HasSubstr("/old.gz is compressed: use zcat"), EndsWith("status 1")));
   EXPECT_THAT(Report("/etc/passwd"), AllOf(HasSubstr("no run of the launcher in /etc/passwd"), EndsWith("status 1")));
   EXPECT_THAT(Report("/tmp/none"), EndsWith("cannot read /tmp/none: No such file or directory\nstatus 1"));
   EXPECT_THAT(Report("/tmp"), EndsWith("cannot read /tmp: Is a directory\nstatus 1"));
