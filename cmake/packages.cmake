@@ -54,8 +54,8 @@ set(CPACK_RPM_EXCLUDE_FROM_AUTO_FILELIST_ADDITION
   /etc/logrotate.d /opt /usr/lib/systemd /usr/lib/systemd/system /usr/lib/tmpfiles.d /usr/share/bash-completion
   /usr/share/bash-completion/completions /usr/share/man /usr/share/man/man8 /usr/share/zsh
   /usr/share/zsh/site-functions)
-# rpm before 4.12 (RHEL 7, SLES 12) ignores Recommends and reads gzip, not zstd. The other lines make equal sources give
-# equal packages.
+# rpm before 4.12 (RHEL 7, SLES 12) ignores Recommends and reads gzip, not zstd. The other lines make the
+# packages reproducible.
 set(CPACK_RPM_SPEC_MORE_DEFINE
 "Packager: ${RUV_MAINTAINER}
 Recommends: logrotate

@@ -2,7 +2,7 @@
 # Completion of ruv-trace's command line for zsh: options and files.
 _arguments \
   '--problems[show only the runs that are not ok]' \
-  '(--json --check)--long[also show tool calls, commands and lines of the file]' \
+  '(--json --check)--long[also show the line number, full reason and commands of each run]' \
   '(--long)--json[print one JSON object per run]' \
   '(--long)--check[judge the last run]' \
   '--show-passwords[show the passwords in commands]' \

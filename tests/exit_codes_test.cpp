@@ -30,7 +30,7 @@ TEST(ExitCodes, GiveResultsAndMessages) {
   }
 }
 
-// The manual is where the texts are written down a second time.
+// The manual repeats the texts.
 TEST(ExitCodes, AreAllInTheManual) {
   std::map<int, std::string> in_table;
   for (const NZEMRUVTAV::ErrMsg& known : NZEMRUVTAV::ErrMsgs) {

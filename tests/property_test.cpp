@@ -71,7 +71,7 @@ std::vector<Call> CallsIn(const string& record) {
   return calls;
 }
 
-// Returns how often the application was started.
+// Checks the recorded calls. Returns how often the application was started.
 unsigned ExpectCalls(const string& record, const GeneratedRun& run, const CommandLine& line) {
   unsigned launches = 0;
   for (const Call& call : CallsIn(record)) {

@@ -38,7 +38,7 @@ const Alternatives kToolOutput = {"Name=pack\n", "Version=2.31a\n", "PackageVers
                                   "Version=\n",  "Version=9",       "VersionVersion=3.00*\n",
                                   "Version\n=",  "Version=*\n",     "*\n"};
 const Alternatives kAnswers = {"y\n", "N\n", "yes\n", "\n", " y\n", "Y", "n", "*\n"};
-// The process group is what Ctrl-C reaches.
+// "kill -INT 0" signals the whole process group, like Ctrl-C.
 const Alternatives kDeaths = {"kill -INT 0", "kill -INT $$", "kill -TERM $$", "kill -KILL $$", "kill -PIPE $$"};
 const Alternatives kEnds = {"exit 0", "exit 0", "exit 1", "exit 255"};
 const Alternatives kToolEnds = {"exit 0",  "exit 32", "exit 21", "exit 52",  "exit 61",  "exit 1",  "exit 2",

@@ -216,7 +216,7 @@ TEST(RunSequence, SurvivesAConsoleThatNobodyReads) {
   EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(1));
 }
 
-TEST(RunSequence, ProgramsDieOfSigpipeUnlessItsParentIgnoresIt) {
+TEST(RunSequence, ProgramsDieOfSigpipeUnlessTheParentIgnoresIt) {
   const Installation machine;
   machine.Install("ruv", "kill -PIPE $$; echo survived");
   EXPECT_EQ(machine.Run().out, "");

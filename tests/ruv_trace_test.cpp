@@ -1,4 +1,4 @@
-// ruv-trace's reports, also of runs at the same time and of damaged traces.
+// ruv-trace's reports, also for concurrent runs and damaged traces.
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -83,7 +83,7 @@ std::string TraceOf(const Strings& arguments, bool portable) {
   return ReadFile(kTraceFile);
 }
 
-// Together they have every message.
+// Together these runs pass through every step: import, check, download, installation and launch.
 const std::vector<std::pair<Strings, bool>> kCompleteRuns = {
     {{"-b"}, true}, {{"--update"}, false}, {{"--ipmi-lan"}, false}};
 
@@ -144,7 +144,7 @@ TEST(RuvTrace, ReportsFailedToolCalls) {
   };
   for (const Row& row : std::initializer_list<Row>{
            {"-b", "expand", 60, "expansion_failed", "Error, package corrupted o...; ruv started"},
-           {"-b", "comparelocal", 127, "check_failed", "tavtool not found; ruv started"},
+           {"-b", "comparelocal", 127, "check_failed", "tavtool not found, ...; ruv started"},
            {"-b", "comparelocal", 126, "check_failed", "tavtool cannot be e...; ruv started"},
            {"-b", "comparelocal", 137, "check_failed", "unknown exit code, ...; ruv started"},
            {"-b", "comparelocal", 128, "check_failed", "unknown exit code; ruv started"},
@@ -225,7 +225,7 @@ TEST(RuvTrace, ReportsAPackageThatIsInstalledAgain) {
   EXPECT_EQ(Runs().back().at("verdict"), "ok");
 }
 
-TEST(RuvTrace, CallsARunOkOnlyIfEachOfItsLinesIsInItsPlace) {
+TEST(RuvTrace, ReportsOkOnlyIfEveryLineIsInSequence) {
   for (const auto& [arguments, portable] : kCompleteRuns) {
     const Strings lines = Lines(TraceOf(arguments, portable));
     ASSERT_EQ(RunsOf(Joined(lines)).at(0).at("verdict"), "ok");
@@ -252,7 +252,7 @@ TEST(RuvTrace, CallsARunOkOnlyIfEachOfItsLinesIsInItsPlace) {
   }
 }
 
-TEST(RuvTrace, SaysWhereARunWasLeft) {
+TEST(RuvTrace, ReportsWhereAnUnfinishedRunStopped) {
   const std::pair<std::string, std::string> rows[] = {
       {"Entering TAVMaster::GetTAVBinaryPath", "?       ?      the launcher's directory was not found, or unfinished"},
       {"TAVMaster: command = ", "?       ?      unfinished: in guihelper.sh"},
@@ -285,7 +285,7 @@ TEST(RuvTrace, SaysWhereARunWasLeft) {
   EXPECT_THAT(Report(), HasSubstr("  4 problem unknown launch machine unknown: no system information; ruv started\n"));
 }
 
-// Runs in which tavtool ends with N if the argument -cN is given. The others launch ruv; all of them start it.
+// Checks runs whose tavtool exits with N if given the argument -cN. All launch-mode runs start ruv.
 void ExpectNothingFalse(const std::vector<json>& runs) {
   for (const json& run : runs) {
     SCOPED_TRACE(run.dump());
@@ -309,7 +309,7 @@ void InstallToolWithCodes(const Installation& machine) {
                   "[ $1 != comparelocal ] || sleep 0.02");
 }
 
-TEST(RuvTrace, ClaimsNothingFalseOfRunsAtTheSameTime) {
+TEST(RuvTrace, ClaimsNothingFalseAboutConcurrentRuns) {
   const Installation machine;
   InstallToolWithCodes(machine);
   std::string all;
@@ -325,7 +325,7 @@ TEST(RuvTrace, ClaimsNothingFalseOfRunsAtTheSameTime) {
   EXPECT_EQ(runs.back().at("verdict"), "ok");
 }
 
-TEST(RuvTrace, ClaimsNothingFalseOfRunsThatOverlap) {
+TEST(RuvTrace, ClaimsNothingFalseAboutInterleavedTraces) {
   const Installation machine;
   InstallToolWithCodes(machine);
   std::vector<Strings> traces;
@@ -438,7 +438,7 @@ TEST(RuvTrace, JudgesTheLastRun) {
   EXPECT_THAT(ReportOf(ok, "--problems"), EndsWith("1 run: 1 ok, 0 problem, 0 unknown\n"));
 }
 
-TEST(RuvTrace, ReadsFilesInTheirOrder) {
+TEST(RuvTrace, ReadsFilesInTheOrderGivenAndRefusesOthers) {
   const Installation machine;
   const std::string trace = TraceOf({"-b"}, false);
   const std::string half = trace.substr(0, trace.find("[TAVRUV]: [Debug:] Entering TAVMaster::InvokeRUV"));
@@ -456,11 +456,11 @@ TEST(RuvTrace, ReadsFilesInTheirOrder) {
   EXPECT_THAT(Report("/tmp/none"), EndsWith("cannot read /tmp/none: No such file or directory\nstatus 1"));
   EXPECT_THAT(Report("/tmp"), EndsWith("cannot read /tmp: Is a directory\nstatus 1"));
   EXPECT_THAT(ReportOf(trace, ">/dev/full"), EndsWith("cannot write: No space left on device\nstatus 1"));
-  // A line without an end, longer than every buffer, hides nothing after it.
+  // A line longer than every buffer hides nothing after it.
   EXPECT_THAT(ReportOf(std::string(3'000'000, 'x') + "\n" + trace), EndsWith("\n1 run: 1 ok, 0 problem, 0 unknown\n"));
 }
 
-TEST(RuvTrace, ExplainsItself) {
+TEST(RuvTrace, PrintsHelpVersionAndUsageErrors) {
   const std::string help = Report("--help");
   EXPECT_EQ(help, Report("-h"));
   EXPECT_THAT(help, StartsWith("Usage: ruv-trace [OPTION]... [FILE]...\n"));

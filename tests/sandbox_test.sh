@@ -33,7 +33,7 @@ expect 7 'namespace package' "$sandbox" --state state sh -c "$write"
 expect 125 'sandbox: no command was given' "$sandbox" --state state
 expect 0 'Runs a command*--keep*' "$sandbox" --help
 
-# Where namespaces are refused, the state is kept too, and the real paths are restored.
+# Where namespaces are refused, the state is kept too, and the real paths are removed.
 expect 7 'real-paths package' refused --state state sh -c "$write"
 expect 7 'real-paths ' refused sh -c "$write"
 expect 0 '' sh -c "$list"

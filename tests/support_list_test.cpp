@@ -56,7 +56,7 @@ TEST(SupportList, GetsAnEntryFromEveryInstallation) {
   }
 }
 
-TEST(SupportList, IsNotMadeWithoutItsFolder) {
+TEST(SupportList, IsNotCreatedIfItsDirectoryIsMissing) {
   const Installation machine;
   machine.CreateRepository();
   machine.InstallTool({{"comparelocal", 21}});

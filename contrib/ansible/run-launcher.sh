@@ -1,6 +1,7 @@
 #!/bin/sh
-# Runs the launcher unattended on this server, alone, and prints what ruv-trace --json says of this run. A further line,
-# also JSON, overrides the verdict where the trace alone cannot give it. run-launcher.yml runs this on each server.
+# Runs the launcher unattended on this server, under the lock, and prints what ruv-trace --json says of this run. A
+# further line, also JSON, overrides the verdict where the trace alone cannot give it. run-launcher.yml runs this on
+# each server.
 # Usage: run-launcher.sh DIRECTORY OUTPUT LOCK_TIMEOUT TIMEOUT [ARGUMENT...]
 #   DIRECTORY     of the launcher and the application
 #   OUTPUT        file for the output of the launcher and the application
@@ -26,7 +27,7 @@ if ! flock -w "$lock_timeout" 9; then
   exit
 fi
 
-# The open trace, read to its end, gives what this run appends, also if the trace is renamed meanwhile.
+# Keeps the trace open at its end, to read later what this run appends, even if the trace is renamed meanwhile.
 [ -e "$trace" ] || trace_before=/dev/null
 exec 3<"${trace_before-$trace}"
 cat <&3 >/dev/null

@@ -62,7 +62,7 @@ std::string MachineTypeOfInputFile(const std::string& path) {
 void TAVMaster::ParseParameters(int argc, char** argv) {
   const char* rejection = nullptr;
   {
-    // A block of its own, because exit() runs no destructors and the exit line comes before the exit.
+    // A block of its own, because exit() does not destroy local objects and the exit line must be traced first.
     const TraceScope trace(*this, __func__);
     TakeArguments(argc, argv);
     rejection = RejectedCombination();

@@ -16,7 +16,7 @@ constexpr const char* kQuestion = "Do you want to proceed anyway (function may b
 
 enum class Answer { kYes, kNo, kOther };
 
-// Returns the next character of standard input, or EOF. Another program may have left it non-blocking: then waits.
+// Returns the next character of standard input, or EOF. Waits if another program has left it non-blocking.
 int NextCharacter() {
   for (;;) {
     errno = 0;

@@ -95,8 +95,8 @@ TAVMaster::TAVMaster() {
   DebugLog("[Status:]TAV Uncompressed Path = %s", uncompressedPath.c_str());
 }
 
-// Reads the identity from the file that guihelper.sh wrote, or that an earlier run left. Keys that never appear leave
-// the defaults. Of the keys on one line the first below counts; of the lines with the same key, the last.
+// Reads the identity from the file that guihelper.sh wrote, or that an earlier run left. A missing key
+// leaves its default. Of several keys on one line the first one below counts; of several lines with a key, the last.
 void TAVMaster::ReadSystemInformation() {
   LineReader file(kSystemInformationFile);
   if (!file.IsOpen()) {

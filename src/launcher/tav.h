@@ -1,14 +1,14 @@
 // The session: one run of the launcher is one TAVMaster, and every step of the run is one of its members.
 //
-// A run: main extends the search paths, the constructor discovers the machine, TAVMasterMain reads the command line and
-// takes one of two roads (update mode or launch mode), and the destructor ends the session. The members are defined by
+// A run: main extends the search paths, the constructor discovers the machine, TAVMasterMain parses the command line
+// and runs in update mode or launch mode, and the destructor ends the session. The members are defined by
 // subject in src/launcher, src/log, src/cli, src/support, src/packages and src/launch.
 //
 // Conventions of all members:
 // - Strings are byte strings in no particular encoding; paths have no trailing slash.
 // - Commands run through the shell and are waited for, with no time limit. Paths are double-quoted in a command
 //   (FormatPathString) unless a member says "bare"; nothing inside the quotes is escaped.
-// - A working member writes "[Debug:] Entering TAVMaster::X()" and "[Debug:] Exiting TAVMaster::X()" to the trace.
+// - A member with a TraceScope traces "[Debug:] Entering TAVMaster::X()" and "[Debug:] Exiting TAVMaster::X()".
 // - Console texts go to standard output.
 #pragma once
 
@@ -23,7 +23,7 @@ class TAVMaster {
   // ---- Session ------------------------------------------------------------------------------------------------------
 
   // Discovers the machine and fills every field: the launcher's directory, the identity that guihelper.sh reports, the
-  // support list, the fixed directories. Prints a warning for each of the two files that cannot be opened. Throws a
+  // support list, the fixed directories. Prints a warning if guihelp.dat or the support list cannot be opened. Throws a
   // plain std::exception if the launcher's own directory cannot be found.
   TAVMaster();
   TAVMaster(const TAVMaster&) = delete;

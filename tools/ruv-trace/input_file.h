@@ -15,7 +15,7 @@ class InputFile {
   InputFile(const InputFile&) = delete;
   InputFile& operator=(const InputFile&) = delete;
 
-  // Sets the line, without its line feed; of a very long line only the end. What follows the last line feed is not a
+  // Sets the line, without its line feed; of a very long line, only its end. What follows the last line feed is not a
   // line. Returns false at the end, and if the file is refused.
   bool Next(std::string& line);
 

@@ -25,7 +25,7 @@ Summarises the RUV launcher's trace, one line per run. Reads the FILEs in this
 order, "-" being standard input; the default is %s.
 
   --problems        show only the runs that are not ok
-  --long            also show tool calls, commands and lines of the file
+  --long            also show each run's line number, full reason and commands
   --json            print one JSON object per run
   --check           judge the last run: one line, and status 0 if it is ok,
                     1 if it is a problem, 2 if unknown, 3 if there is none
@@ -62,7 +62,7 @@ class Printer {
     }
   }
 
-  // Prints what follows the last run. Returns the exit status that it deserves.
+  // Prints the totals or, with --check, the last run. Returns the exit status.
   ExitStatus Finish() const {
     const unsigned long runs = ok_ + problems_ + unknown_;
     if (options_.check) {

@@ -18,9 +18,9 @@ std::string Folded(std::string_view text) {
   return folded;
 }
 
-// Returns the length of the argument at the beginning of the text. Blanks in quotes belong to it. So do the next words
-// that are neither quoted nor look like an option or a redirection: the launcher leaves only those bare that have been
-// typed in one argument with a dash.
+// Returns the length of the argument at the beginning of the text. Blanks in quotes belong to it. So do the
+// following words, unless they are quoted or look like an option or a redirection: such bare words can only come from
+// one argument with a dash, which the launcher does not quote.
 std::size_t ArgumentLength(std::string_view text) {
   char quote = 0;
   std::size_t length = 0;
@@ -39,7 +39,7 @@ std::size_t ArgumentLength(std::string_view text) {
   return length;
 }
 
-// Returns where the value begins of the option at the position, or npos if there is none that takes a password.
+// Returns where the value of the option at the position begins, or npos if no option with a password is there.
 std::size_t ValueOfOption(const std::string& folded, std::size_t position) {
   if (position > 0 && kBlanksAndQuotes.find(folded[position - 1]) == std::string_view::npos) return std::string::npos;
   for (const std::string_view option : {"-t", "--ipmi-lan", "--vmware-esxi", "--remote-zfld"}) {

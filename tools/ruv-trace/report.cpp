@@ -41,7 +41,7 @@ Json JsonCalls(const Run& run, bool show_passwords) {
   return calls;
 }
 
-// Whether a character moves or hides text: DEL, C1, and the marks of writing direction and line end.
+// True if the character moves or hides text: DEL, C1, zero-width, text-direction and line-separator characters.
 bool IsControl(std::string_view character) {
   return character == "\x7F" || (character >= "\xC2\x80" && character < "\xC2\xA0") || character == "\xD8\x9C" ||
          (character >= "\xE2\x80\x8B" && character <= "\xE2\x80\x8F") ||
@@ -86,7 +86,7 @@ std::string Outcome(const Run& run, std::size_t width) {
   }
   text = Printable(text);
   std::string ruv = known.application == kUnknown ? "" : "; ruv " + InWords(known.application);
-  // Only a launch starts ruv: for the others that may be left out.
+  // Only launch mode starts ruv: in the other modes this part may be dropped to save space.
   if (known.mode != kLaunchMode && Width(text) + ruv.size() > width) ruv.clear();
   if (Width(text) + ruv.size() > width) text = Cell(text, width - ruv.size());
   return text + ruv;
@@ -160,8 +160,8 @@ std::string JsonLine(const Run& run, bool show_passwords) {
 }
 
 std::string Printable(std::string_view text) {
-  // The library's strings escape control characters and replace invalid UTF-8; what is left is to undo two escapes and
-  // to escape a few more characters.
+  // The JSON library escapes control characters and replaces invalid UTF-8. Undoes two of its escapes and escapes a few
+  // more characters.
   const std::string quoted = JsonText(std::string(text));
   std::string_view rest = std::string_view(quoted).substr(1, quoted.size() - 2);
   std::string printable;

@@ -1,4 +1,4 @@
-// A run in the words of the output.
+// Formats a run for output.
 #ifndef RUV_TRACE_REPORT_H
 #define RUV_TRACE_REPORT_H
 

@@ -37,7 +37,7 @@ struct Facts {
   Identity used;        // on the package tool's command lines
   std::string_view mode = kUnknown;
   std::vector<ToolCall> calls;          // of the package tool
-  std::string_view package = kUnknown;  // what became of it
+  std::string_view package = kUnknown;  // its state at the end
   std::string package_version;          // empty if not in the trace
   Command copy_command;                 // of the package's copy script
   unsigned long copy_output_lines = 0;  // of the copy script
@@ -58,26 +58,26 @@ class Run {
   unsigned long number;
   std::string file;
   unsigned long line;
-  bool installed_again = false;    // the package that the last installation had installed
-  bool others_unfinished = false;  // when it began
+  bool installed_again = false;    // the last installation was of the same package
+  bool others_unfinished = false;  // when this run began
 
   // Takes a message of the trace. Returns false if no launcher writes it at this point of a run.
   bool Take(std::string_view message);
-  // Takes a line of something else: of the copy script, or of a command that has a line feed in it.
+  // Takes a line without the launcher's prefix: copy-script output, or the rest of a command with a line feed in it.
   void TakeOther(std::string_view text);
-  // Makes uncertain what comes after the point at which the other run was left.
+  // Marks everything after the point where the other run stopped as uncertain.
   void BeginBeforeEndOf(const Run& other);
-  // Drops everything: a line is out of turn.
+  // Discards all facts, because a line is out of sequence.
   void Doubt(std::string_view reason);
 
   bool IsMixed() const { return !doubt_.empty(); }
-  // Whether later lines may be those of an unfinished run.
+  // True if later lines may be those of an unfinished run.
   bool IsDoubtful() const { return frozen_; }
   bool Finished() const;
   bool RunsCopyScript() const;
-  // Whether the application runs, or the question before it is open.
+  // True if the application runs, or the question before it is open.
   bool RunsApplication() const;
-  // Whether the launcher can end here without a message: after the help text, with rejected options, and without its
+  // True if the launcher can end here without a message: after the help text, with rejected options, and without its
   // own directory.
   bool MayHaveEnded() const;
 
@@ -90,9 +90,9 @@ class Run {
   // Returns why the trace does not show the run's outcome, or "" if it does.
   std::string Unclear() const;
 
-  // Whether some launcher writes the message at some point.
+  // True if some launcher writes the message at some point.
   static bool Knows(std::string_view message);
-  // Whether the message is one of those after the application's end, which are the same in all runs.
+  // True if the message is one of those after the application's end, which are the same in all runs.
   static bool Closes(std::string_view message);
 
  private:

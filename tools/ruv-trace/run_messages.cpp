@@ -1,5 +1,5 @@
-// The messages of a run in the order in which one launcher writes them, and what each of them says. A message that is
-// not next is another run's, or some are missing before it.
+// The messages of a run, the order in which a launcher writes them, and the fact that each of them adds. A message out
+// of sequence belongs to another run, or messages before it are missing.
 #include <algorithm>
 #include <charconv>
 #include <initializer_list>
@@ -31,8 +31,8 @@ std::string_view TakeWord(std::string_view& command) {
   return word;
 }
 
-// Whether the application's command shows that -b, -i or -r was given. An argument that holds blanks and a dash is in
-// the command as typed, and looks like several; that is not told apart.
+// True if the application's command shows that -b, -i or -r was given. An argument that contains spaces and a
+// dash is in the command as typed and is taken for several arguments: the two cases look the same.
 bool SuppressesQuestion(const Command& command) {
   std::string_view rest = command.text;
   TakeWord(rest);  // the application
@@ -74,7 +74,7 @@ void TakePortable(Facts& facts, const Command& value) {
   if (facts.mode == kUnknown) facts.mode = kLaunchMode;
 }
 
-// After a successful download comes once more whether the installation is portable.
+// After a successful download the launcher traces again whether the installation is portable.
 void TakeDownloadLeft(Facts& facts, const Command&) { facts.portable = false; }
 
 void TakeCopyScript(Facts& facts, const Command& value) {
@@ -82,7 +82,7 @@ void TakeCopyScript(Facts& facts, const Command& value) {
   facts.package_version = VersionIn(value.text);
 }
 
-// An installation makes the machine type a supported one, so that no question is asked.
+// An installation adds the machine type to the supported ones, so no question is asked.
 void TakeCopied(Facts& facts, const Command&) {
   facts.no_question = true;
   if (facts.copy_output_lines != 1) facts.shell_complaint.clear();
@@ -102,7 +102,7 @@ void TakeEnd(Facts& facts, const Command&) {
   facts.application = facts.mode != kLaunchMode ? kNotStarted : started ? kStarted : kStartedOrDeclined;
 }
 
-// Whether a run can end with this. If not, the lines of whole steps are missing.
+// True if a run can end with these facts. If not, the lines of whole steps are missing.
 bool IsOutcome(const Facts& facts) {
   if ((facts.mode == kLaunchMode) == facts.command.text.empty()) return false;
   if (facts.package == kAvailable) return facts.mode == kCheckMode;

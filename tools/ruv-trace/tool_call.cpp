@@ -36,7 +36,7 @@ std::optional<std::string> TakeUntil(std::string_view& text, std::string_view ma
   return before;
 }
 
-// Returns what the launcher makes of an exit code: one of the results in exit_code_tables.h.
+// Returns the launcher's result for an exit code: one of those in exit_code_tables.h.
 int ResultOf(int exit_code) {
   for (const NZEMRUVTAV::ToolResult& known : NZEMRUVTAV::kToolResults) {
     if (known.exit_code == exit_code) return known.result;
@@ -86,11 +86,11 @@ std::string_view ToolCall::Meaning() const {
   if (!text.empty()) return text.substr(0, text.find_last_not_of('.') + 1);
   switch (*exit_code) {
     case -1:
-      return "no shell could be started";
+      return "the shell could not be started or waited for";
     case 126:
       return "tavtool cannot be executed";
     case 127:
-      return "tavtool not found";
+      return "tavtool not found, or no shell could be started";
     default:
       return *exit_code > 128 ? "unknown exit code, or ended by a signal" : "unknown exit code";
   }

@@ -23,7 +23,7 @@ struct Command {
   bool MayBeCut() const { return room == 0; }
 };
 
-// What became of the package after a tool call; see the manual page.
+// States of the package after a tool call; see the manual page.
 inline constexpr std::string_view kNothingNewer = "nothing_newer";
 inline constexpr std::string_view kAvailable = "available";
 inline constexpr std::string_view kCheckFailed = "check_failed";
@@ -40,13 +40,13 @@ struct ToolCall {
   Command command;
   std::optional<int> exit_code = {};  // empty if not in the trace
 
-  // True if the code says that something went wrong. That there is no newer package is not wrong.
+  // True if the exit code reports a failure. Finding no newer package is not one.
   bool Failed() const;
   // Returns the exit code's meaning in words.
   std::string_view Meaning() const;
-  // Returns what became of the package, or "" if the call does not change that. There must be an exit code.
+  // Returns the package's state after the call, or "" if the call does not change it. There must be an exit code.
   std::string_view Package() const;
-  // Sets the values that the command gives for the machine.
+  // Sets the machine type, operating system and architecture that the command contains.
   void ReadIdentity(Identity& identity) const;
 };
 

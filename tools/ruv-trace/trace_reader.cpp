@@ -7,7 +7,7 @@ namespace {
 
 constexpr std::string_view kPrefix = NZEMRUVTAV::kLinePrefix;
 
-// After so many runs that ended in turn, an unfinished one is taken for dead.
+// After this many runs have ended in sequence, an unfinished one is assumed to have been killed.
 constexpr std::size_t kMostHeld = 20;
 
 constexpr std::string_view kMixed = "mixed with another run, or lines are missing";
@@ -25,7 +25,7 @@ void TraceReader::TakeLine(std::string_view line) {
   ++line_;
   const bool prefixed = line.substr(0, kPrefix.size()) == kPrefix;
   if (prefixed && TakeMessage(line.substr(kPrefix.size()))) return;
-  // The last words of a copy script may lack a line feed: then the launcher's line follows on the same line.
+  // A copy script's output may lack a final line feed: then the launcher's line follows on the same line.
   const std::size_t position = line.rfind(kPrefix);
   const bool inside = position != std::string_view::npos && position > 0;
   if (inside && TakeMessage(line.substr(position + kPrefix.size()))) return;
@@ -54,7 +54,7 @@ void TraceReader::BeginRun() {
   const bool silent_end = run_ && run_->MayHaveEnded() && !run_->IsMixed();
   silent_ends_ = silent_end ? silent_ends_ + 1 : 0;
   if (run_ && !silent_end) {
-    // Where both of two runs were left is not remembered.
+    // Only one unfinished run can be remembered.
     if (left_ || run_->IsDoubtful()) run_->Doubt(kMixed);
     // The lines after the application's end are the same in all runs: nothing of the next run can be taken for them.
     if (!run_->RunsApplication()) left_ = run_;

@@ -1,13 +1,13 @@
-// Puts the lines of a trace together to runs.
+// Groups the lines of a trace into runs.
 //
-// The lines name no process, so launchers that run at the same time write into each other's runs. What is certain:
-// - A run that begins while no other is unfinished, and whose lines all are next in turn to the end, is whole.
-// - Of a run that is unfinished when the next begins, the lines until then are certain.
-// - That next run may end with the lines of the unfinished one, if both got to the same point and one was killed there.
-//   What it did before that point is certain.
-// - As soon as a line is out of turn, nothing of the run is.
-// A later run may also end with the lines of an unfinished one that took longer; its own lines then come afterwards.
-// For that, runs are held back until some more have come to their end in turn.
+// The lines do not identify their process, so the lines of concurrent runs are mixed. These facts are certain:
+// - A run that begins while no other is unfinished, and whose lines are all in sequence to the end, is complete.
+// - If a run is unfinished when the next one begins, its lines up to that point are certain.
+// - That next run may end with the lines of the unfinished one, if both reached the same point and one was killed
+//   there. The lines before that point are certain.
+// - As soon as a line is out of sequence, nothing about the run is certain.
+// A later run may also end with the lines of an unfinished one that took longer; its own lines then follow. Therefore
+// runs are held back until enough later runs have ended in sequence.
 #ifndef RUV_TRACE_TRACE_READER_H
 #define RUV_TRACE_TRACE_READER_H
 
@@ -35,7 +35,7 @@ class TraceReader {
   // Reports the runs that are held back: the trace ends here.
   void End();
 
-  // Whether the file holds a line of a run.
+  // True if the file contains a line of a run.
   bool FoundRuns() const { return found_runs_; }
 
  private:
