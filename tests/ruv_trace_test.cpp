@@ -204,16 +204,20 @@ TEST(RuvTrace, ReportsCopyScripts) {
   machine.Run({"-b"});
   EXPECT_THAT(Report(), HasSubstr("  1 problem 1234    launch copy script not run: not found; ruv started\n"));
   EXPECT_EQ(Runs().at(0).at("package"), "copy_script_not_run");
+  machine.InstallCopyScript();
+  machine.Run({"-b"});
+  EXPECT_THAT(Report(), HasSubstr("  2 ok      1234    launch 2.31: copy script ran; ruv started\n"));
   fs::remove_all(kExpansionDirectory);
   machine.Run({"-b"});
-  EXPECT_THAT(Report(), HasSubstr("  2 problem 1234    launch the package has no copy script; ruv started\n"));
-  EXPECT_EQ(Runs().at(1).at("package"), "no_copy_script");
+  EXPECT_THAT(Report(), HasSubstr("  3 problem 1234    launch the package has no copy script; ruv started\n"));
+  EXPECT_EQ(Runs().at(2).at("package"), "no_copy_script");
 }
 
 TEST(RuvTrace, ReportsAPackageThatIsInstalledAgain) {
   const Installation machine;
   ProvidePackage(machine);
   machine.Run({"-b"});
+  machine.InstallTool({{"compareweb", 31}, {"comparelocal", 21}}, "Version=2.31\n");
   machine.Run({"--chkupd"});  // says nothing about the installed package
   machine.Run({"-b"});
   EXPECT_THAT(Report(), HasSubstr("  3 problem 1234    launch 2.31 installed again: the last instal...; ruv started\n"
@@ -241,7 +245,8 @@ TEST(RuvTrace, ReportsOkOnlyIfEveryLineIsInSequence) {
       twice.insert(twice.begin() + static_cast<std::ptrdiff_t>(i), lines[i]);
       Strings swapped = lines;
       std::swap(swapped[i], swapped[(i + 1) % lines.size()]);
-      for (const Strings& trace : {cut, missing, copies ? missing : twice, copies ? missing : swapped}) {
+      if (copies || i + 1 == lines.size()) twice = missing;  // the last line twice is another run's
+      for (const Strings& trace : {cut, missing, twice, copies ? missing : swapped}) {
         if (trace == lines) continue;
         const json last = RunsOf(Joined(trace)).back();
         EXPECT_EQ(last.at("verdict"), "unknown");
@@ -309,6 +314,23 @@ void InstallToolWithCodes(const Installation& machine) {
                   "[ $1 != comparelocal ] || sleep 0.02");
 }
 
+TEST(RuvTrace, LeavesOtherRunsAloneWhileTheApplicationRuns) {
+  const Installation machine;
+  machine.Run({"--chkupd"});
+  const std::string check = ReadFile(kTraceFile);
+  const std::string help = check.substr(0, check.find("[TAVRUV]: [Debug:] Exiting TAVMaster::ParseParameters"));
+  const std::string launch = TraceOf({"-b"}, false);
+  const std::size_t end = launch.find("[TAVRUV]: [Debug:] Exiting TAVMaster::InvokeRUV");
+  std::string trace = launch.substr(0, end) + help;
+  for (int i = 0; i < 25; ++i) trace += check;
+  EXPECT_THAT(ReportOf(trace + launch.substr(end) + check), EndsWith("\n28 runs: 26 ok, 0 problem, 2 unknown\n"));
+  // Killed runs: each is as certain as the first.
+  const std::string cut = launch.substr(0, launch.find('\n', launch.find("CompareTAVPackage: TAVToolCmd")) + 1);
+  EXPECT_THAT(ReportOf(cut + cut + check + check),
+              AllOf(HasSubstr("  2 unknown 1234    launch unfinished: in tavtool\n"),
+                    EndsWith("\n4 runs: 2 ok, 0 problem, 2 unknown\n")));
+}
+
 TEST(RuvTrace, ClaimsNothingFalseAboutConcurrentRuns) {
   const Installation machine;
   InstallToolWithCodes(machine);
@@ -373,7 +395,9 @@ TEST(RuvTrace, HidesPasswords) {
   for (const Strings& arguments :
        {Strings{"-t", "me:secret@host/a@b"}, Strings{"-t", "me:secret secret@host", "-v"},
         Strings{"--ipmi-lan", "me:secret@10.0.0.1:8"}, Strings{"--VMWARE-ESXI", "me:se:cret@h"},
-        Strings{"--remote-zfld", "me:secret-secret@h"}, Strings{"--proxy-password=secret secret", "-v"},
+        Strings{"--remote-zfld", "me:secret -secret@h"}, Strings{"--ipmi-lan", "-t", "me:x -secret@h"},
+        Strings{"--ipmi-lan=me:secret@h"}, Strings{"-t", "me:x\n-secret@h"}, Strings{"--proxy-password=x 2>secret -x"},
+        Strings{"--proxy-password=secret secret", "-v"},
         Strings{std::string(440, '-'), "--proxy-password=secretsecretsecretsecret"}}) {
     machine.Run(arguments);
   }
@@ -383,7 +407,7 @@ TEST(RuvTrace, HidesPasswords) {
   for (const char* option : {"--long", "--json"})
     EXPECT_THAT(Report(option + std::string(" --show-passwords")), HasSubstr("secret"));
   EXPECT_THAT(Report("--long"),
-              AllOf(HasSubstr("--proxy-user=me --Proxy-Password=*** -v 2>/dev/null"),
+              AllOf(HasSubstr("--proxy-user=me --Proxy-Password=*** 2>/dev/null"),
                     HasSubstr("-t \"me:***@b\" 2>/dev/null"), HasSubstr("--ipmi-lan \"me:***@10.0.0.1:8\""),
                     HasSubstr("--remote-zfld me:***@h 2>/dev/null"), HasSubstr("--vmware-esxi \"me:***@h\"")));
 }
@@ -394,6 +418,7 @@ TEST(RuvTrace, ShowsTextButNoControlCharacters) {
   machine.Run({"-b", "\xc3\xb6\x07\xc2\x9b\xe2\x80\xae\\\"\x7f\n\xfe"});
   EXPECT_THAT(Report(), HasSubstr("  1 ok      \xc3\xa4\xe2\x82\xac\\u... launch"));
   EXPECT_THAT(Report("--long"), HasSubstr("\"\xc3\xb6\\u0007\\u009b\\u202e\\\"\\u007f\\n\xef\xbf\xbd\" 2>/dev/null\n"));
+  EXPECT_THAT(Report("--json"), Not(::testing::ContainsRegex("[\x7f-\xff]")));
   EXPECT_EQ(Runs().at(0).at("machine_type"), "\xc3\xa4\xe2\x82\xac\x1b\xef\xbf\xbd");
 }
 
@@ -450,6 +475,9 @@ TEST(RuvTrace, ReadsFilesInTheOrderGivenAndRefusesOthers) {
   EXPECT_THAT(Report("- <" + old_file), EndsWith("\n1 run: 0 ok, 0 problem, 1 unknown\n"));
   EXPECT_EQ(Runs(both).at(0).at("file"), old_file);
   EXPECT_EQ(ReportOf("x\n" + trace, "--check --json | grep -c '\"line\":2,'"), "1\n");
+  WriteFile(machine.Directory() + "/new", "");
+  EXPECT_THAT(Report(both), EndsWith("\n1 run: 0 ok, 0 problem, 1 unknown\n"));
+  EXPECT_THAT(Report("--check " + machine.Directory() + "/new"), AllOf(HasSubstr("no run of"), EndsWith("status 3")));
   std::system(("gzip " + old_file).c_str());
   EXPECT_THAT(Report(old_file + ".gz"), AllOf(HasSubstr("/old.gz is compressed: use zcat"), EndsWith("status 1")));
   EXPECT_THAT(Report("/etc/passwd"), AllOf(HasSubstr("no run of the launcher in /etc/passwd"), EndsWith("status 1")));

@@ -13,7 +13,12 @@ constexpr int kGzipMagic = 0x1F;
 }  // namespace
 
 InputFile::InputFile(const std::string& name)
-    : name_(name), file_(name == "-" ? stdin : std::fopen(name.c_str(), "re")), error_(file_ == nullptr ? errno : 0) {}
+    : name_(name), file_(name == "-" ? stdin : std::fopen(name.c_str(), "re")), error_(file_ == nullptr ? errno : 0) {
+  if (file_ == nullptr) return;
+  const int first = std::ungetc(std::getc(file_), file_);
+  empty_ = first == EOF;
+  compressed_ = first == kGzipMagic;
+}
 
 InputFile::~InputFile() {
   if (file_ != nullptr && file_ != stdin) std::fclose(file_);
@@ -23,9 +28,6 @@ bool InputFile::Next(std::string& line) {
   line.clear();
   if (file_ == nullptr || compressed_) return false;
   for (int byte = 0; (byte = getc_unlocked(file_)) != EOF;) {
-    if (!begun_ && byte == kGzipMagic) compressed_ = true;
-    begun_ = true;
-    if (compressed_) return false;
     if (byte == '\n') return true;
     if (line.size() == kLongestLine) line.erase(0, kLongestLine - kKeptEnd);
     line.push_back(static_cast<char>(byte));
@@ -37,7 +39,7 @@ bool InputFile::Next(std::string& line) {
 std::string InputFile::Refusal(bool holds_runs) const {
   if (error_ != 0) return "cannot read " + name_ + ": " + std::strerror(error_);
   if (compressed_) return name_ + " is compressed: use zcat -f " + name_ + " | ruv-trace -";
-  return holds_runs ? "" : "no run of the launcher in " + name_;
+  return holds_runs || empty_ ? "" : "no run of the launcher in " + name_;
 }
 
 }  // namespace ruv_trace

@@ -19,15 +19,15 @@ class InputFile {
   // line. Returns false at the end, and if the file is refused.
   bool Next(std::string& line);
 
-  // Returns why the file is refused: it cannot be read, is compressed, or (holds_runs is false) holds no run. Returns
-  // "" if it is not.
+  // Returns why the file is refused: it cannot be read, is compressed, or holds something but (holds_runs is
+  // false) no run. Returns "" if it is not.
   std::string Refusal(bool holds_runs) const;
 
  private:
   std::string name_;
   std::FILE* file_;
   int error_ = 0;
-  bool begun_ = false;
+  bool empty_ = false;
   bool compressed_ = false;
 };
 

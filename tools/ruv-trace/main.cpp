@@ -47,6 +47,13 @@ struct Options {
 
 void Complain(const std::string& message) { std::fprintf(stderr, "ruv-trace: %s\n", Printable(message).c_str()); }
 
+// Returns false, with a message, if the output could not be written.
+bool Written() {
+  if (std::fflush(stdout) == 0 && std::ferror(stdout) == 0) return true;
+  Complain(std::string("cannot write: ") + std::strerror(errno));
+  return false;
+}
+
 // Prints runs as the options want them, and counts them.
 class Printer {
  public:
@@ -98,20 +105,23 @@ class Printer {
   std::optional<Run> last_;
 };
 
-// Reads the files. Returns false, with a message for each, if some were refused.
+// Reads the files. Returns false, with a message for each, if some were refused or all are empty.
 bool ReadFiles(const std::vector<std::string>& names, TraceReader& reader) {
   bool all_read = true;
+  bool found_runs = false;
   for (const std::string& name : names) {
     InputFile file(name);
     reader.BeginFile(name);
     for (std::string line; file.Next(line);) reader.TakeLine(line);
+    found_runs = found_runs || reader.FoundRuns();
     const std::string refusal = file.Refusal(reader.FoundRuns());
     if (refusal.empty()) continue;
     Complain(refusal);
     all_read = false;
   }
   reader.End();
-  return all_read;
+  if (all_read && !found_runs) Complain("no run of the launcher in " + names.back());
+  return all_read && found_runs;
 }
 
 ExitStatus Summarise(const Options& options, const std::vector<std::string>& names) {
@@ -121,11 +131,7 @@ ExitStatus Summarise(const Options& options, const std::vector<std::string>& nam
   const bool all_read = ReadFiles(names, reader);
   if (options.check && !all_read) return failure;
   const ExitStatus status = printer.Finish();
-  if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
-    Complain(std::string("cannot write: ") + std::strerror(errno));
-    return failure;
-  }
-  return all_read ? status : failure;
+  return Written() && all_read ? status : failure;
 }
 
 }  // namespace
@@ -152,10 +158,10 @@ int main(int argc, char** argv) {
         break;
       case 'h':
         std::printf(kHelp, default_file.c_str());
-        return EXIT_SUCCESS;
+        return Written() ? EXIT_SUCCESS : EXIT_FAILURE;
       case 'V':
         std::puts("ruv-trace " RUV_VERSION);
-        return EXIT_SUCCESS;
+        return Written() ? EXIT_SUCCESS : EXIT_FAILURE;
       default:
         std::fputs("Try ruv-trace --help.\n", stderr);
         return kUsageError;

@@ -7,8 +7,6 @@
 namespace ruv_trace {
 namespace {
 
-constexpr std::string_view kBlanks = " \t\n";
-constexpr std::string_view kBlanksAndQuotes = " \t\n\"'";
 constexpr std::string_view kMask = "***";
 constexpr std::string_view kProxyPassword = "--proxy-password=";
 
@@ -18,63 +16,54 @@ std::string Folded(std::string_view text) {
   return folded;
 }
 
-// Returns the length of the argument at the beginning of the text. Blanks in quotes belong to it. So do the
-// following words, unless they are quoted or look like an option or a redirection: such bare words can only come from
-// one argument with a dash, which the launcher does not quote.
-std::size_t ArgumentLength(std::string_view text) {
-  char quote = 0;
-  std::size_t length = 0;
-  for (; length < text.size(); ++length) {
-    const char byte = text[length];
-    if (quote != 0) {
-      if (byte == quote) quote = 0;
-    } else if (byte == '"' || byte == '\'') {
-      quote = byte;
-    } else if (kBlanks.find(byte) != std::string_view::npos) {
-      const std::string_view next = text.substr(length + 1);
-      const bool redirection = next.substr(0, 2) == "1>" || next.substr(0, 2) == "2>";
-      if (next.empty() || redirection || next[0] == '-' || next[0] == '"') break;
+// Returns where the arguments end: the launcher adds redirections.
+std::size_t EndOfArguments(std::string_view command) {
+  for (bool found = true; found;) {
+    found = false;
+    for (const std::string_view redirection : {" 1>/dev/null", " 1>tav.log", " 2>/dev/null", " 2>&1"}) {
+      if (command.size() < redirection.size()) continue;
+      if (command.substr(command.size() - redirection.size()) != redirection) continue;
+      command.remove_suffix(redirection.size());
+      found = true;
     }
   }
-  return length;
+  return command.size();
 }
 
-// Returns where the value of the option at the position begins, or npos if no option with a password is there.
-std::size_t ValueOfOption(const std::string& folded, std::size_t position) {
-  if (position > 0 && kBlanksAndQuotes.find(folded[position - 1]) == std::string_view::npos) return std::string::npos;
+// Returns the position after the first option that has a login as its value, or npos.
+std::size_t FindLogin(const std::string& folded) {
+  std::size_t first = std::string::npos;
   for (const std::string_view option : {"-t", "--ipmi-lan", "--vmware-esxi", "--remote-zfld"}) {
-    if (folded.compare(position, option.size(), option) != 0) continue;
-    const std::size_t blank = folded.find_first_of(kBlanks, position);
-    const std::size_t end = folded.find_first_not_of("\"'", position + option.size());
-    if (blank == end) return folded.find_first_not_of(kBlanks, blank);
+    for (std::size_t at = 0; (at = folded.find(option, at)) != std::string::npos; ++at) {
+      const std::size_t end = at + option.size();
+      const bool begins = at == 0 || std::string_view(" \t\n\"'").find(folded[at - 1]) != std::string_view::npos;
+      if (begins && (end == folded.size() || std::isalnum(static_cast<unsigned char>(folded[end])) == 0)) {
+        first = std::min(first, end);
+      }
+    }
   }
-  return std::string::npos;
+  return first;
 }
 
 }  // namespace
 
 std::string WithoutPasswords(std::string_view command) {
   const std::string folded = Folded(command);
+  const std::size_t end = EndOfArguments(command);
+  const std::size_t proxy = std::min(folded.find(kProxyPassword.substr(0, kProxyPassword.size() - 1)), end);
   std::string shown;
   std::size_t done = 0;
   const auto hide = [&](std::size_t from, std::size_t to) {
     shown.append(command.substr(done, from - done)).append(kMask);
     done = to;
   };
-  for (std::size_t position = 0; position < folded.size(); position = std::max(position + 1, done)) {
-    if (folded.compare(position, kProxyPassword.size(), kProxyPassword) == 0) {
-      const std::size_t secret = position + kProxyPassword.size();
-      hide(secret, secret + ArgumentLength(command.substr(secret)));
-      continue;
-    }
-    const std::size_t value = ValueOfOption(folded, position);
-    if (value == std::string::npos) continue;
-    const std::string_view argument = command.substr(value, ArgumentLength(command.substr(value)));
-    const std::size_t colon = argument.find(':');
-    if (colon == std::string_view::npos) continue;
-    const std::size_t at = argument.rfind('@');
-    hide(value + colon + 1, value + (at == std::string_view::npos || at < colon ? argument.size() : at));
+  const std::size_t login = FindLogin(folded);
+  const std::size_t colon = login < proxy ? command.find(':', login) : std::string_view::npos;
+  if (colon < proxy) {
+    const std::size_t at = command.rfind('@', proxy);
+    hide(colon + 1, at != std::string_view::npos && at > colon ? at : proxy);
   }
+  if (proxy < end) hide(std::min(proxy + kProxyPassword.size(), end), end);
   return shown.append(command.substr(done));
 }
 

@@ -6,9 +6,10 @@
 
 namespace ruv_trace {
 
-// Returns the command with *** for each password: what follows --proxy-password=, and the middle of user:password@host
-// after -t, --ipmi-lan, --vmware-esxi and --remote-zfld. Hides too much rather than too little, also where the command
-// was cut or is quoted in strange ways.
+// Returns the command with *** for each password: everything after --proxy-password=; and after the first -t,
+// --ipmi-lan,
+// --vmware-esxi or --remote-zfld with user:password@host, everything from the first colon to the last @. Where an
+// argument ends cannot be told from the command, so other arguments may be hidden as well.
 std::string WithoutPasswords(std::string_view command);
 
 }  // namespace ruv_trace

@@ -156,7 +156,7 @@ std::string JsonLine(const Run& run, bool show_passwords) {
                      {"command", UnlessEmpty(Shown(known.command, show_passwords))},
                      {"command_cut", !known.command.text.empty() && known.command.MayBeCut()},
                      {"tool_calls", JsonCalls(run, show_passwords)}};
-  return JsonText(json) + "\n";
+  return json.dump(-1, ' ', true, Json::error_handler_t::replace) + "\n";
 }
 
 std::string Printable(std::string_view text) {

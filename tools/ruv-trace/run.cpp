@@ -43,8 +43,8 @@ void Run::TakeOther(std::string_view text) {
 
 void Run::BeginBeforeEndOf(const Run& other) {
   run_before_ = other.number;
-  doubtful_after_ = other.last_;
-  frozen_ = other.IsMixed();
+  doubtful_after_.push_back(other.last_);
+  frozen_ = frozen_ || other.IsDoubtful();
 }
 
 void Run::Doubt(std::string_view reason) {

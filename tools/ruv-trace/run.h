@@ -26,9 +26,8 @@ inline constexpr std::string_view kStarted = "started";
 inline constexpr std::string_view kStartedOrDeclined = "started_or_declined";
 inline constexpr std::string_view kNotStarted = "not_started";
 
-// The messages that begin and end a run, and the one after the first.
+// The messages that begin and end a run.
 inline constexpr std::string_view kFirstMessage = "[Debug:] Enter: TAVMaster::TAVMaster()";
-inline constexpr std::string_view kSecondMessage = "[Debug:] Entering TAVMaster::GetTAVBinaryPath()";
 inline constexpr std::string_view kLastMessage = "[Debug:] Exiting TAVMaster::~TAVMaster()";
 
 // What the lines of a run say.
@@ -117,7 +116,7 @@ class Run {
   const Message* last_ = nullptr;
   bool awaits_exit_code_ = false;  // of the package tool
   std::string_view error_text_due_;
-  const Message* doubtful_after_ = nullptr;
+  std::vector<const Message*> doubtful_after_;
   unsigned long run_before_ = 0;  // the unfinished one
   bool frozen_ = false;           // nothing more is certain
   Facts facts_;

@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <charconv>
 #include <initializer_list>
-#include <utility>
 
 #include "launcher/command_fragments.h"
 #include "log/trace_format.h"
@@ -126,7 +125,7 @@ struct Run::Message {
 // After each command of the package tool come its exit code and, for some codes, the first line of their message.
 const Run::Message Run::kMessages[] = {
     {'A', "B", kFirstMessage},
-    {kOwnDirectory, "C", kSecondMessage},
+    {kOwnDirectory, "C", "[Debug:] Entering TAVMaster::GetTAVBinaryPath()"},
     {'C', "D", "[Debug:] Exiting TAVMaster::GetTAVBinaryPath()"},
     {kHelper, "EG", "[Status:]TAVMaster: command = "},
     {'E', "F", "[Debug:] Entering TAVMaster::OSMapping(), code = "},
@@ -182,8 +181,12 @@ const Run::Message Run::kMessages[] = {
 };
 
 bool Run::Take(std::string_view message) {
-  if (last_ != nullptr && last_ == doubtful_after_) frozen_ = true;
-  if (!error_text_due_.empty()) return message == std::exchange(error_text_due_, {});
+  if (std::find(doubtful_after_.begin(), doubtful_after_.end(), last_) != doubtful_after_.end()) frozen_ = true;
+  if (!error_text_due_.empty()) {
+    const bool is_due = message == error_text_due_;
+    if (is_due) error_text_due_ = {};
+    return is_due;
+  }
   if (awaits_exit_code_) return TakeExitCode(message);
   const Message* next = Next(message);
   if (next == nullptr) return false;

@@ -54,26 +54,25 @@ void TraceReader::BeginRun() {
   const bool silent_end = run_ && run_->MayHaveEnded() && !run_->IsMixed();
   silent_ends_ = silent_end ? silent_ends_ + 1 : 0;
   if (run_ && !silent_end) {
-    // Only one unfinished run can be remembered.
-    if (left_ || run_->IsDoubtful()) run_->Doubt(kMixed);
     // The lines after the application's end are the same in all runs: nothing of the next run can be taken for them.
-    if (!run_->RunsApplication()) left_ = run_;
+    if (run_->IsDoubtful() || !run_->RunsApplication()) left_.push_back(*run_);
+    if (left_.size() > kMostHeld) left_.pop_front();
     in_turn_ = 0;
   }
   if (run_) Hold();
   run_.emplace(++runs_, file_, line_);
   run_->Take(kFirstMessage);
   run_->others_unfinished = others_unfinished;
-  if (left_) run_->BeginBeforeEndOf(*left_);
+  for (const Run& left : left_) run_->BeginBeforeEndOf(left);
   ++unfinished_;
 }
 
 void TraceReader::EndRun() {
   unfinished_ -= 1 + silent_ends_;
   silent_ends_ = 0;
-  if (run_->IsDoubtful()) left_.reset();
+  if (run_->IsDoubtful()) left_.clear();
   if (++in_turn_ == kMostHeld) {
-    left_.reset();
+    left_.clear();
     unfinished_ = 0;
   }
   Hold();
@@ -81,27 +80,31 @@ void TraceReader::EndRun() {
 
 // Takes a message that is not the next one of the run: it is another run's, or some are missing before it.
 void TraceReader::TakeOutOfTurn(std::string_view message) {
-  if (run_) {
-    run_->Doubt(kMixed);
-  } else {
-    if (!Run::Knows(message)) return;
-    if (unfinished_ == 0 || message == kSecondMessage) {
-      ++unfinished_;
-      run_.emplace(++runs_, file_, line_);
-      run_->Doubt(kHeadless);
-    }
-  }
-  found_runs_ = true;
-  in_turn_ = 0;
-  // The runs since an unfinished one may have ended with its lines, and this may be their own.
-  if (!Run::Closes(message)) {
-    for (Run& each : held_) {
-      if (each.others_unfinished) each.Doubt(kMixed);
-    }
+  if (!run_ && !Run::Knows(message)) return;
+  const bool others_unfinished = unfinished_ > (run_ ? 1 : 0);
+  // The last lines of a run that was in the application meanwhile say nothing about others.
+  if (!Run::Closes(message) || (run_ && (!others_unfinished || run_->Finished()))) {
+    DoubtAll();
+    found_runs_ = true;
   }
   if (message != kLastMessage || unfinished_ == 0 || --unfinished_ > 0) return;
-  left_.reset();
+  left_.clear();
   if (run_) Hold();
+}
+
+// Nothing is certain of the run, nor of those since an unfinished one: they may have ended with its lines.
+void TraceReader::DoubtAll() {
+  in_turn_ = 0;
+  if (run_) {
+    run_->Doubt(kMixed);
+  } else if (unfinished_ == 0) {
+    ++unfinished_;
+    run_.emplace(++runs_, file_, line_);
+    run_->Doubt(kHeadless);
+  }
+  for (Run& each : held_) {
+    if (each.others_unfinished) each.Doubt(kMixed);
+  }
 }
 
 void TraceReader::Hold() {
@@ -113,11 +116,10 @@ void TraceReader::Hold() {
 void TraceReader::ReportFirst() {
   Run& run = held_.front();
   const Facts& known = run.Known();
-  const bool installed = known.package == kCopyScriptRan || known.package == kCopyScriptNotRun;
-  if (installed && !known.copy_command.MayBeCut()) {
+  if (known.package == kCopyScriptRan && !known.copy_command.MayBeCut()) {
     run.installed_again = known.copy_command.text == installed_ && !known.package_version.empty();
     installed_ = known.copy_command.text;
-  } else if (known.package == kNothingNewer) {
+  } else if (known.package == kNothingNewer && known.mode != kCheckMode) {
     installed_.clear();
   }
   report_(run);

@@ -41,6 +41,7 @@ class TraceReader {
  private:
   bool TakeMessage(std::string_view message);
   void TakeOutOfTurn(std::string_view message);
+  void DoubtAll();
   void BeginRun();
   void EndRun();
   void Hold();
@@ -52,7 +53,7 @@ class TraceReader {
   bool found_runs_ = false;
   unsigned long runs_ = 0;
   std::optional<Run> run_;         // the last one that began, until it ends
-  std::optional<Run> left_;        // an unfinished one whose lines may be among those of the next
+  std::deque<Run> left_;           // unfinished ones whose lines may be among those of the next
   unsigned long silent_ends_ = 0;  // runs just before run_ that may have ended without a message
   std::deque<Run> held_;           // the runs before run_, not reported yet
   unsigned long unfinished_ = 0;   // runs that may still go on, run_ included
