@@ -70,6 +70,11 @@ void TypeAfterTheQuestion(int terminal, const std::string& text, const std::stri
 
 bool IsInstrumented() { return *RUV_SANITIZE != '\0' || std::getenv("RUV_TEST_WRAPPER") != nullptr; }
 
+std::string TestedProgram(const std::string& built, const std::string& installed) {
+  const char* directory = std::getenv("RUV_TEST_PROGRAMS");
+  return directory == nullptr ? built : directory + ("/" + installed);
+}
+
 void WriteFile(const std::string& path, const std::string& text) {
   fs::create_directories(fs::path(path).parent_path());
   std::ofstream(path, std::ios::binary) << text;
@@ -87,7 +92,7 @@ Installation::Installation() {
   char name[] = "/tmp/ruv-test.XXXXXX";
   directory_ = mkdtemp(name);
   fs::create_directory(directory_ + "/cwd");
-  fs::copy_file(LAUNCHER_EXE, directory_ + "/launcher");
+  fs::copy_file(TestedProgram(LAUNCHER_EXE, "launcher"), directory_ + "/launcher");
   for (const char* program : {"ruv", "tavtool", "guihelper.sh"}) Install(program);
   WriteFile(kSystemInformationFile, "ZEM_SYSTEM_OS=203\nZEM_SYSTEM_MT=1234\nZEM_SYSTEM_ARCH=64\n");
   WriteFile(SupportListFile(), "<MT>1234</MT>\n");

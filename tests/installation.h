@@ -85,5 +85,8 @@ class Installation {
 // far more memory than the launcher.
 bool IsInstrumented();
 
+// Returns the path of a program to be tested: of this build or, if RUV_TEST_PROGRAMS is set, in that directory.
+std::string TestedProgram(const std::string& built, const std::string& installed);
+
 void WriteFile(const std::string& path, const std::string& text);
 std::string ReadFile(const std::string& path);  // empty if there is no such file

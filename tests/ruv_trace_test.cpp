@@ -30,7 +30,7 @@ const std::string kHeader = "RUN VERDICT MACHINE DID    PACKAGE AND RUV, OR WHAT
 
 // Returns both outputs of ruv-trace and, unless it is 0, its exit status. The arguments are shell text.
 std::string Report(const std::string& arguments = "") {
-  setenv("RUV_TRACE", RUV_TRACE_EXE, 1);
+  setenv("RUV_TRACE", TestedProgram(RUV_TRACE_EXE, "bin/ruv-trace").c_str(), 1);
   std::string text;
   std::FILE* pipe = popen(("exec 2>&1; \"$RUV_TRACE\" " + arguments).c_str(), "r");
   for (int byte = 0; (byte = std::getc(pipe)) != EOF;) text.push_back(static_cast<char>(byte));
