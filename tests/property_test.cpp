@@ -1,5 +1,5 @@
 // Properties of every run, checked on generated command lines, files and programs.
-//   RUV_PROPERTY_RUNS  number of runs (default 150)
+//   RUV_PROPERTY_RUNS  number of runs (default 200)
 //   RUV_PROPERTY_SEED  seed of the first run (default 1); each further run has the next one
 #include <algorithm>
 #include <cstdlib>
@@ -152,7 +152,7 @@ unsigned long FromEnvironment(const char* variable, unsigned long otherwise) {
 }  // namespace
 
 TEST(Property, HoldsForEveryRun) {
-  const unsigned long runs = FromEnvironment("RUV_PROPERTY_RUNS", 150);
+  const unsigned long runs = FromEnvironment("RUV_PROPERTY_RUNS", 200);
   const unsigned long first_seed = FromEnvironment("RUV_PROPERTY_SEED", 1);
   std::map<string, unsigned long> tally;
   for (unsigned long number = 0; number < runs && !HasFailure(); ++number) {
@@ -165,6 +165,6 @@ TEST(Property, HoldsForEveryRun) {
     Check(run, tally);
   }
   std::cout << runs << " runs from seed " << first_seed << ": " << PrintToString(tally) << "\n";
-  if (runs < 150) return;
+  if (runs < 200) return;
   for (const auto& [what, count] : tally) EXPECT_GE(count, runs / 100) << "too few runs with: " << what;
 }
