@@ -384,7 +384,7 @@ TEST(RuvTrace, ClaimsNothingFalseAboutInterleavedTraces) {
     }
     const std::vector<json> runs = RunsOf(trace);
     ExpectNothingFalse(runs);
-    for (const json& run : runs) verdicts.insert(run.at("verdict"));
+    for (const json& run : runs) verdicts.insert(run.at("verdict").get<std::string>());
   }
   EXPECT_THAT(verdicts, SizeIs(3));
 }
