@@ -174,13 +174,97 @@ TEST(RuvTrace, ReportsToolCalls) {
   EXPECT_EQ(call.at("meaning"), "success");
   EXPECT_FALSE(call.at("command_cut"));
   EXPECT_THAT(call.at("command").get<std::string>(), EndsWith("--force --latest 2>/dev/null 1>/dev/null 2>&1"));
-  EXPECT_THAT(
-      machine.WithPlainDirectory(Report("--long")),
-      HasSubstr(
-          "      line 1 of /var/log/ZEM_Support/ruvtav.log, machine 5678 rhel5/64\n"
-          "      compareweb 0: update available\n"
-          "        \"@/tavtool\" compareweb -l \"@\" -m 5678 -o rhel5 -a 64 --latest 2>/dev/null 1>/dev/null 2>&1\n"
-          "      acquire 0: success\n"));
+}
+
+TEST(RuvTrace, PrintsAllThatARunSays) {
+  const Installation machine;
+  ProvidePackage(machine);
+  fs::create_directories(machine.Directory() + "/media/update");
+  machine.Run({"-b"}, Environment("ZEM_PORTABLE_EXEC_DIR", machine.Directory() + "/media"));
+  EXPECT_EQ(machine.WithPlainDirectory(Report("--long")),
+            kHeader +
+                R"(  1 ok      1234    launch 2.31: copy script ran; ruv started
+      line 1 of /var/log/ZEM_Support/ruvtav.log, machine 1234 rhel5/64
+      copy 0: success
+        "@/tavtool" copy -l "@/media/update" -t "/var/ZEM_Support" -m 1234 -o rhel5 -a 64 1>/dev/null 2>&1
+      comparelocal 21: newer package
+        "@/tavtool" comparelocal -l "/var/ZEM_Support" -s "@" -m 1234 -o rhel5 -a 64 1>tav.log 2>&1
+      expand 0: success
+        @/tavtool expand -l "/var/ZEM_Support" -t "/tmp/tav" -m 1234 -o rhel5 -a 64 1>/dev/null 2>&1
+      command: "@/ruv" -b 2>/dev/null
+1 run: 1 ok, 0 problem, 0 unknown
+)");
+  EXPECT_EQ(machine.WithPlainDirectory(Report("--json")),
+            R"({"file":"/var/log/ZEM_Support/ruvtav.log","line":1,"run":1,"verdict":"ok","reason":null,)"
+            R"("machine_type":"1234","operating_system":"rhel5","architecture":"64","mode":"launch",)"
+            R"("package":"copy_script_ran","package_version":"2.31","ruv":"started",)"
+            R"("command":"\"@/ruv\" -b 2>/dev/null","command_cut":false,"tool_calls":[)"
+            R"({"verb":"copy","exit_code":0,"result":"ok","meaning":"success","command":"\"@/tavtool\" copy )"
+            R"(-l \"@/media/update\" -t \"/var/ZEM_Support\" -m 1234 -o rhel5 -a 64 1>/dev/null 2>&1",)"
+            R"("command_cut":false},{"verb":"comparelocal","exit_code":21,"result":"ok","meaning":"newer package",)"
+            R"("command":"\"@/tavtool\" comparelocal -l \"/var/ZEM_Support\" -s \"@\" -m 1234 -o rhel5 -a 64 )"
+            R"(1>tav.log 2>&1","command_cut":false},{"verb":"expand","exit_code":0,"result":"ok",)"
+            R"("meaning":"success","command":"@/tavtool expand -l \"/var/ZEM_Support\" -t \"/tmp/tav\" -m 1234 )"
+            R"(-o rhel5 -a 64 1>/dev/null 2>&1","command_cut":false}]})"
+            "\n");
+  const Strings lines = Lines(ReadFile(kTraceFile));
+  EXPECT_EQ(ReportOf(Joined({lines.begin() + 1, lines.end()}), "--long"),
+            kHeader +
+                "  1 unknown ?       ?      its beginning is missing\n"
+                "      line 1 of /var/log/ZEM_Support/ruvtav.log, machine ? ?/?\n"
+                "      reason: its beginning is missing\n"
+                "1 run: 0 ok, 0 problem, 1 unknown\n");
+  EXPECT_EQ(ReportOf(lines[0] + Joined({lines.begin() + 2, lines.end()}), "--check"),
+            "unknown: mixed with another run, or lines are missing (run 1)\nstatus 2");
+}
+
+TEST(RuvTrace, GivesTheMeaningOfExitCodes) {
+  struct Row {
+    std::string verb;
+    int exit_code;
+    std::string result;
+    std::string meaning;
+    std::string package;
+  };
+  const Row rows[] = {
+      {"copy", 0, "ok", "success", "unknown"},
+      {"copy", 1, "problem", "Invalid command parameter specified", "unknown"},
+      {"copy", 30, "ok", "You already have the latest version RUV", "unknown"},
+      {"comparelocal", 0, "ok", "nothing newer", "nothing_newer"},
+      {"comparelocal", 21, "ok", "newer package", "available"},
+      {"comparelocal", 61, "ok", "no payload", "nothing_newer"},
+      {"comparelocal", -1, "problem", "the shell could not be started or waited for", "check_failed"},
+      {"comparelocal", 126, "problem", "tavtool cannot be executed", "check_failed"},
+      {"comparelocal", 127, "problem", "tavtool not found, or no shell could be started", "check_failed"},
+      {"comparelocal", 128, "problem", "unknown exit code", "check_failed"},
+      {"comparelocal", 129, "problem", "unknown exit code, or ended by a signal", "check_failed"},
+      {"expand", 0, "ok", "success", "expanded"},
+      {"expand", 52, "ok", "no payload", "expanded"},
+      {"expand", 21, "problem", "unexpected exit code", "expansion_failed"},
+      {"expand", 40, "problem", "There's no update available for this system on internet currently",
+       "expansion_failed"},
+      {"compareweb", 0, "ok", "update available", "available"},
+      {"compareweb", 52, "problem", "unexpected exit code", "check_failed"},
+      {"compareweb", 33, "ok", "There's no update available for this system on internet currently", "nothing_newer"},
+      {"acquire", 32, "ok", "success", "downloaded"},
+      {"acquire", 30, "problem", "You already have the latest version RUV", "download_failed"},
+  };
+  const std::string traces[] = {TraceOf({"-b"}, true), TraceOf({"--update"}, false)};
+  const Installation machine;
+  for (const Row& row : rows) {
+    const std::string& trace = traces[row.verb == "compareweb" || row.verb == "acquire" ? 1 : 0];
+    const std::string mark = "Return Code from tavtool = ";
+    const std::size_t code = trace.find(mark, trace.find(" " + row.verb + " -l "));
+    const json run = RunsOf(trace.substr(0, code + mark.size()) + std::to_string(row.exit_code) + "\n").at(0);
+    const json& call = run.at("tool_calls").back();
+    SCOPED_TRACE(call.dump());
+    EXPECT_EQ(call.at("verb"), row.verb);
+    EXPECT_EQ(call.at("exit_code"), row.exit_code);
+    EXPECT_EQ(call.at("result"), row.result);
+    EXPECT_EQ(call.at("meaning"), row.meaning);
+    EXPECT_EQ(run.at("package"), row.package);
+    EXPECT_EQ(run.at("verdict"), row.result == "ok" ? "unknown" : "problem");
+  }
 }
 
 TEST(RuvTrace, ReportsCopyScripts) {
@@ -329,6 +413,11 @@ TEST(RuvTrace, LeavesOtherRunsAloneWhileTheApplicationRuns) {
   EXPECT_THAT(ReportOf(cut + cut + check + check),
               AllOf(HasSubstr("  2 unknown 1234    launch unfinished: in tavtool\n"),
                     EndsWith("\n4 runs: 2 ok, 0 problem, 2 unknown\n")));
+  // After so many whole runs, a killed one is taken for dead.
+  std::string later = launch.substr(0, launch.find('\n', launch.find("DecompressTAV: TAVToolCmd")) + 1);
+  EXPECT_THAT(ReportOf(later + launch), HasSubstr("  2 unknown 1234    launch unfinished run 1 may have gone on"));
+  for (int i = 0; i < 25; ++i) later += check;
+  EXPECT_THAT(ReportOf(later + launch), EndsWith("\n27 runs: 26 ok, 0 problem, 1 unknown\n"));
 }
 
 TEST(RuvTrace, ClaimsNothingFalseAboutConcurrentRuns) {

@@ -34,7 +34,6 @@ std::string_view TakeWord(std::string_view& command) {
 // dash is in the command as typed and is taken for several arguments: the two cases look the same.
 bool SuppressesQuestion(const Command& command) {
   std::string_view rest = command.text;
-  TakeWord(rest);  // the application
   while (!rest.empty()) {
     std::string_view word = TakeWord(rest);
     const bool takes_value = IsOneOf(word, {"-d", "-html"});
