@@ -120,6 +120,7 @@ TEST(RuvTrace, ReportsWhatARunDid) {
   ExpectReport({"-r", "x"}, {}, "nothing_newer", same);
   ExpectReport({}, {}, "nothing_newer", same + " or declined");
   ExpectReport({"-d", "b"}, {}, "nothing_newer", same + " or declined");
+  ExpectReport({"-d", "-b"}, {}, "nothing_newer", same);
   ExpectReport({"x\n-b y"}, {}, "nothing_newer", same + " or declined");
   ExpectReport({"-d", "--show_stderr"}, {}, "nothing_newer",
                "problem launch option -d has no value; ruv started or declined");
@@ -269,6 +270,7 @@ TEST(RuvTrace, GivesTheMeaningOfExitCodes) {
 
 TEST(RuvTrace, ReportsCopyScripts) {
   const std::pair<std::string, std::string> rows[] = {
+      {"printf x", "ok      1234    launch 2.31: copy script ran; ruv started\n"},
       {"exit 3", "ok      1234    launch 2.31: copy script ran; ruv started\n"},
       {"rm \"$0\"", "ok      1234    launch 2.31: copy script ran; ruv started\n"},
       {"printf '[TAVRUV]: [Status:]Return Code from tavtool = 9\\nno line feed'",
@@ -408,11 +410,15 @@ TEST(RuvTrace, LeavesOtherRunsAloneWhileTheApplicationRuns) {
   std::string trace = launch.substr(0, end) + help;
   for (int i = 0; i < 25; ++i) trace += check;
   EXPECT_THAT(ReportOf(trace + launch.substr(end) + check), EndsWith("\n28 runs: 26 ok, 0 problem, 2 unknown\n"));
+  const std::size_t middle = check.find("[TAVRUV]: [Debug:] Entering TAVMaster::CheckUpdate");
+  EXPECT_THAT(ReportOf(launch.substr(0, end) + check.substr(0, middle) + launch.substr(end) + check.substr(middle)),
+              EndsWith("\n2 runs: 1 ok, 0 problem, 1 unknown\n"));
   // Killed runs: each is as certain as the first.
   const std::string cut = launch.substr(0, launch.find('\n', launch.find("CompareTAVPackage: TAVToolCmd")) + 1);
   EXPECT_THAT(ReportOf(cut + cut + check + check),
               AllOf(HasSubstr("  2 unknown 1234    launch unfinished: in tavtool\n"),
                     EndsWith("\n4 runs: 2 ok, 0 problem, 2 unknown\n")));
+  EXPECT_THAT(Report("--long"), HasSubstr("      reason: unfinished: in tavtool\n      comparelocal: no exit code\n"));
   // After so many whole runs, a killed one is taken for dead.
   std::string later = launch.substr(0, launch.find('\n', launch.find("DecompressTAV: TAVToolCmd")) + 1);
   EXPECT_THAT(ReportOf(later + launch), HasSubstr("  2 unknown 1234    launch unfinished run 1 may have gone on"));
@@ -485,7 +491,8 @@ TEST(RuvTrace, HidesPasswords) {
        {Strings{"-t", "me:secret@host/a@b"}, Strings{"-t", "me:secret secret@host", "-v"},
         Strings{"--ipmi-lan", "me:secret@10.0.0.1:8"}, Strings{"--VMWARE-ESXI", "me:se:cret@h"},
         Strings{"--remote-zfld", "me:secret -secret@h"}, Strings{"--ipmi-lan", "-t", "me:x -secret@h"},
-        Strings{"--ipmi-lan=me:secret@h"}, Strings{"-t", "me:x\n-secret@h"}, Strings{"--proxy-password=x 2>secret -x"},
+        Strings{"--ipmi-lan=me:secret@h"}, Strings{"-t", "a@b:secret"}, Strings{"-t", "me:secret"},
+        Strings{"-t", "me:x\n-secret@h"}, Strings{"--proxy-password=x 2>secret -x"},
         Strings{"--proxy-password=secret secret", "-v"},
         Strings{std::string(440, '-'), "--proxy-password=secretsecretsecretsecret"}}) {
     machine.Run(arguments);
@@ -508,6 +515,10 @@ TEST(RuvTrace, ShowsTextButNoControlCharacters) {
   EXPECT_THAT(Report(), HasSubstr("  1 ok      \xc3\xa4\xe2\x82\xac\\u... launch"));
   EXPECT_THAT(Report("--long"), HasSubstr("\"\xc3\xb6\\u0007\\u009b\\u202e\\\"\\u007f\\n\xef\xbf\xbd\" 2>/dev/null\n"));
   EXPECT_THAT(Report("--json"), Not(::testing::ContainsRegex("[\x7f-\xff]")));
+  // What moves or hides text is escaped, what is next to it in Unicode is not.
+  const std::string shown = "\xc2\xa0\xe2\x80\x90\xe2\x80\xa7\xe2\x80\xaf\xe2\x81\xa5\xe2\x81\xaa";
+  machine.Run({"-b", shown + "\xd8\x9c\xe2\x80\x8b\xe2\x80\x8f\xe2\x80\xa8\xe2\x81\xa6\xe2\x81\xa9"});
+  EXPECT_THAT(Report("--long"), HasSubstr(shown + "\\u061c\\u200b\\u200f\\u2028\\u2066\\u2069\" 2>/dev/null\n"));
   EXPECT_EQ(Runs().at(0).at("machine_type"), "\xc3\xa4\xe2\x82\xac\x1b\xef\xbf\xbd");
 }
 
@@ -543,7 +554,7 @@ TEST(RuvTrace, JudgesTheLastRun) {
             "ruv started (run 2)\nstatus 1");
   EXPECT_THAT(ReportOf(cut, "--check"),
               AllOf(StartsWith("unknown: unfinished: between two steps"), EndsWith("status 2")));
-  EXPECT_EQ(ReportOf("text\n", "--check"),
+  EXPECT_EQ(ReportOf("[TAVRUV]: text\n", "--check"),
             std::string("ruv-trace: no run of the launcher in ") + kTraceFile + "\nstatus 3");
   EXPECT_EQ(ReportOf(ok + ok, "--problems"),
             kHeader +
