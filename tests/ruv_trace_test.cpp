@@ -177,6 +177,20 @@ TEST(RuvTrace, ReportsToolCalls) {
   EXPECT_THAT(call.at("command").get<std::string>(), EndsWith("--force --latest 2>/dev/null 1>/dev/null 2>&1"));
 }
 
+TEST(RuvTrace, SaysWhichCommandsMayBeCut) {
+  const Installation machine;
+  machine.Run({"-b"});
+  const std::string begin = "[Status:]InvokeRUV: command = ";
+  const std::size_t room = 511 - begin.size() - Runs().at(0).at("command").get<std::string>().size();
+  for (const std::size_t longer : {room - 1, room, room + 1}) {
+    machine.Run({"-b", std::string(longer - 3, 'x')});
+    const json run = Runs().back();
+    EXPECT_EQ(run.at("command_cut"), longer >= room);
+    EXPECT_EQ(begin.size() + run.at("command").get<std::string>().size(), 511 - (longer < room ? 1U : 0U));
+  }
+  EXPECT_THAT(Report("--long"), EndsWith("2>/dev/nul...\n4 runs: 4 ok, 0 problem, 0 unknown\n"));
+}
+
 TEST(RuvTrace, PrintsAllThatARunSays) {
   const Installation machine;
   ProvidePackage(machine);
@@ -515,6 +529,12 @@ TEST(RuvTrace, ShowsTextButNoControlCharacters) {
   EXPECT_THAT(Report(), HasSubstr("  1 ok      \xc3\xa4\xe2\x82\xac\\u... launch"));
   EXPECT_THAT(Report("--long"), HasSubstr("\"\xc3\xb6\\u0007\\u009b\\u202e\\\"\\u007f\\n\xef\xbf\xbd\" 2>/dev/null\n"));
   EXPECT_THAT(Report("--json"), Not(::testing::ContainsRegex("[\x7f-\xff]")));
+  machine.CreateRepository();
+  machine.InstallTool({{"comparelocal", 21}}, "Version=2\x1b[3m\n");
+  machine.InstallCopyScript();
+  EXPECT_EQ(machine.Run({"-b"}).status, 0);
+  EXPECT_THAT(Report(), HasSubstr("launch 2\\u001b[3: copy script ran; ruv started\n"));
+  machine.InstallTool({});
   // What moves or hides text is escaped, what is next to it in Unicode is not.
   const std::string shown = "\xc2\xa0\xe2\x80\x90\xe2\x80\xa7\xe2\x80\xaf\xe2\x81\xa5\xe2\x81\xaa";
   machine.Run({"-b", shown + "\xd8\x9c\xe2\x80\x8b\xe2\x80\x8f\xe2\x80\xa8\xe2\x81\xa6\xe2\x81\xa9"});
