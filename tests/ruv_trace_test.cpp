@@ -616,5 +616,6 @@ TEST(RuvTrace, PrintsHelpVersionAndUsageErrors) {
   EXPECT_THAT(help, StartsWith("Usage: ruv-trace [OPTION]... [FILE]...\n"));
   EXPECT_THAT(Lines(help), AllOf(SizeIs(::testing::Le(16U)), Each(SizeIs(::testing::Le(81U)))));
   EXPECT_THAT(Report("--version"), MatchesRegex("ruv-trace [0-9]+\\.[0-9]+\\.[0-9]+\n"));
+  EXPECT_THAT(Report("--help >/dev/full"), EndsWith("status 1"));
   EXPECT_THAT(Report("--no-such-option"), EndsWith("Try ruv-trace --help.\nstatus 64"));
 }
