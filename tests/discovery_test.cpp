@@ -1,7 +1,11 @@
 // Start-up discovery: the launcher's directory, and the machine described by the system information file.
+#include <fcntl.h>
+#include <unistd.h>
+
 #include <filesystem>
 
 #include "installation.h"
+#include "launcher/line_reader.h"
 #include "launcher/tav.h"
 
 using ::testing::ElementsAre;
@@ -40,7 +44,10 @@ TEST(Discovery, ReadsTheSystemInformationFile) {
       {"x ZEM_SYSTEM_MT=12 ZEM_SYSTEM_MT=34\n", {"windows", "12 ZEM_SYSTEM_MT=34", "64"}},
       {"ZEM_SYSTEM_MT=1234 abc\r\n", {"windows", "1234 abc\r", "64"}},
       {"ZEM_SYSTEM_MT=1111\nZEM_SYSTEM_MT=2222\n", {"windows", "2222", "64"}},
-      {"ZEM_SYSTEM_MT=1 ZEM_SYSTEM_OS=201\nZEM_SYSTEM_ARCH=8 ZEM_SYSTEM_MT=7\n", {"rhel3", "7", "64"}},
+      {"ZEM_SYSTEM_MT=1 ZEM_SYSTEM_OS=201\n", {"rhel3", "0000", "64"}},
+      {"ZEM_SYSTEM_OS=201 ZEM_SYSTEM_MT=1 ZEM_SYSTEM_ARCH=8\n", {"rhel3", "0000", "64"}},
+      {"ZEM_SYSTEM_ARCH=8 ZEM_SYSTEM_MT=7\n", {"windows", "7", "64"}},
+      {"ZEM_SYSTEM_MT=7 ZEM_SYSTEM_ARCH=8\n", {"windows", "7 ZEM_SYSTEM_ARCH=8", "64"}},
       {"zem_system_os=201\nZEM_SYSTEM_MT\nZEM_SYSTEM_ARCH=\n", {"windows", "0000", ""}},
   };
   const Installation machine;
@@ -99,6 +106,42 @@ TEST(Discovery, TreatsDirectoriesInPlaceOfItsFilesAsEmpty) {
   EXPECT_THAT(run.out, Not(HasSubstr("WARNING")));
   EXPECT_THAT(Identity(machine), ElementsAre("windows", "0000", "64"));
   EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(1));
+}
+
+// The master side of a pseudoterminal: reading fails with EIO once the other side is closed.
+TEST(Discovery, IgnoresALineThatAReadErrorCutsShort) {
+  const int descriptor = dup(STDIN_FILENO);
+  close(descriptor);  // the file gets the same number
+  NZEMRUVTAV::LineReader file("/dev/ptmx");
+  ASSERT_EQ(unlockpt(descriptor), 0);
+  const int other_side = open(ptsname(descriptor), O_RDWR | O_NOCTTY);
+  ASSERT_EQ(write(other_side, "whole\ncut", 9), 9);
+  close(other_side);
+  std::string_view line;
+  EXPECT_TRUE(file.Next(line));
+  EXPECT_EQ(line, "whole\r");
+  EXPECT_FALSE(file.Next(line));
+}
+
+// 100 MB without a line feed, in each of the files that the launcher reads.
+TEST(Discovery, EndsWithOneLineIfALineDoesNotFitIntoMemory) {
+  if (IsInstrumented()) GTEST_SKIP() << "needs more memory than the launcher";
+  for (const std::string& file :
+       {std::string(kSystemInformationFile), std::string("data/supportlist.xml"), std::string("cwd/tav.log")}) {
+    SCOPED_TRACE(file);
+    const Installation machine;
+    machine.CreateRepository();
+    machine.InstallCopyScript();
+    const std::string path = file[0] == '/' ? file : machine.Directory() + "/" + file;
+    const std::string lengthen = "truncate -s 100M '" + path + "'";
+    machine.Install("guihelper.sh", lengthen);
+    machine.Install("tavtool", lengthen + "; exit 21");
+    const RunResult run = machine.Run({"-v"}, With("prlimit --as=60000000"));
+    EXPECT_EQ(run.status, 1);
+    EXPECT_EQ(run.out, "ERROR: Not enough memory, RUV launcher ends.\n");
+    EXPECT_THAT(machine.CallsOf("copy.sh"), IsEmpty());
+    EXPECT_THAT(machine.CallsOf("ruv"), IsEmpty());
+  }
 }
 
 TEST(Discovery, RunsTheHelperScriptFirst) {

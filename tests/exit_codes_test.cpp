@@ -51,7 +51,7 @@ TEST(ExitCodes, AreAllInTheManual) {
   EXPECT_EQ(in_manual, in_table);
 }
 
-TEST(ExitCodes, OfAToolThatCannotRunAreSilentFailures) {
+TEST(ExitCodes, AToolThatCannotRunFailsSilently) {
   const Installation machine;
   machine.CreateRepository();
   fs::remove(machine.Directory() + "/tavtool");

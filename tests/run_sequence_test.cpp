@@ -100,6 +100,8 @@ TEST(RunSequence, UpdateModeStopsAtAFailedStepAndNeverStartsTheApplication) {
       {"--CHKUPD", {{"compareweb", 21}}, "", check, ""},
       {"--update", {{"compareweb", 2}}, "", check, ""},
       {"--update", {{"acquire", 77}}, detected + "Failed\n", download, ""},
+      {"--update", {{"acquire", 21}}, detected + "Failed\n", download, ""},
+      {"--update", {{"acquire", 52}}, detected + "Failed\n", download, ""},
       {"--update", {{"acquire", 45}}, no_kro, download, ""},
       {"--update", {{"compareweb", 32}, {"acquire", 32}}, detected + "Done\n", compare, ""},
       {"--update", {{"comparelocal", 30}}, detected + latest + "Done\n", compare, ""},

@@ -8,7 +8,7 @@
 
 namespace fs = std::filesystem;
 
-TEST(Session, TestsForFilesAndDirectoriesFollowLinks) {
+TEST(Session, FileExistAndDirExistFollowLinks) {
   const Installation machine;
   const NZEMRUVTAV::TAVMaster session;
   const std::string base = machine.Directory() + "/kinds/";
@@ -27,6 +27,20 @@ TEST(Session, TestsForFilesAndDirectoriesFollowLinks) {
        {base + "dangling", base + "file/below", std::string(), base + std::string(300, 'n')}) {
     EXPECT_FALSE(session.FileExist(neither) || session.DirExists(neither)) << neither;
   }
+}
+
+TEST(Session, StepsReturnTheirResults) {
+  const Installation machine;
+  NZEMRUVTAV::TAVMaster session;  // its directory is this program's, which has no data
+  const std::string data = session.GetWorkingPath() + "/data";
+  ASSERT_TRUE(fs::create_directory(data));
+  EXPECT_EQ(session.TAVMasterGetSupportList(), -1);
+  EXPECT_EQ(session.UpdateSupportList(), 1);
+  EXPECT_EQ(session.TAVMasterGetSupportList(), 0);
+  fs::remove_all(data);
+  EXPECT_EQ(session.UpdateSupportList(), 0);
+  EXPECT_EQ(session.InvokeRUV("true", {}, false), 1);
+  EXPECT_EQ(session.InvokeRUV("false", {}, false), 1);
 }
 
 TEST(Session, RemembersPrebootOptions) {

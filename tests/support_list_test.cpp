@@ -9,7 +9,7 @@ using ::testing::StartsWith;
 
 namespace fs = std::filesystem;
 
-TEST(SupportList, ReadsTheFourCharactersAfterATag) {
+TEST(SupportList, ReadsColumns5To8OfALineWithATag) {
   struct Row {
     std::string text;
     Strings supported;

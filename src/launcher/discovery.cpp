@@ -31,7 +31,7 @@ constexpr std::string_view kArchitectureKey = "ZEM_SYSTEM_ARCH=";
 // Passed to OSMapping if the value is not an int. No system has this code, so nothing changes.
 constexpr int kNoOperatingSystemCode = -1;
 
-// An address in this program: this file is linked into it statically.
+// dladdr needs an address inside the launcher's executable; this file is linked into it.
 constexpr char kAddressInProgram = 0;
 
 // Returns everything after the first occurrence of the key in the line.
@@ -95,8 +95,8 @@ TAVMaster::TAVMaster() {
   DebugLog("[Status:]TAV Uncompressed Path = %s", uncompressedPath.c_str());
 }
 
-// Reads the identity from the file that guihelper.sh wrote, or that an earlier run left. A missing key
-// leaves its default. Of several keys on one line the first one below counts; of several lines with a key, the last.
+// Reads the identity from the file that guihelper.sh wrote, or that an earlier run left. A missing key leaves its
+// default. Of several keys on one line the one tested first below counts; of several lines with a key, the last.
 void TAVMaster::ReadSystemInformation() {
   LineReader file(kSystemInformationFile);
   if (!file.IsOpen()) {

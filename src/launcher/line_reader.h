@@ -18,7 +18,8 @@ class LineReader {
   bool IsOpen() const { return file_ != nullptr; }
 
   // Sets the line, without its line feed; it is valid until the next call. Returns false at the end of the file and
-  // after a read error, also if the error came in the middle of a line.
+  // after a read error, also if the error came in the middle of a line. Throws std::bad_alloc if the line does not fit
+  // into memory.
   bool Next(std::string_view& line);
 
  private:

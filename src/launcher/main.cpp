@@ -13,7 +13,7 @@
 namespace {
 
 // Ends the process with one line and status 1, instead of an abort and a core file. The launcher itself throws only a
-// plain std::exception. Anything else is a lack of memory; there is no type if not even the exception could be created.
+// plain std::exception. Anything else is a lack of memory; the type is null if not even the exception could be created.
 [[noreturn]] void ReportUncaughtException() {
   const std::type_info* type = abi::__cxa_current_exception_type();
   const bool directory_is_unknown = type != nullptr && *type == typeid(std::exception);

@@ -1,8 +1,9 @@
 // The session: one run of the launcher is one TAVMaster, and every step of the run is one of its members.
 //
 // A run: main extends the search paths, the constructor discovers the machine, TAVMasterMain parses the command line
-// and runs in update mode or launch mode, and the destructor ends the session. The members are defined by
-// subject in src/launcher, src/log, src/cli, src/support, src/packages and src/launch.
+// and runs in update mode or launch mode, and the destructor ends the session. The members are defined by subject in
+// src/launcher (the constructor in discovery.cpp, the destructor in session.cpp), src/log, src/cli, src/support,
+// src/packages and src/launch.
 //
 // Conventions of all members:
 // - Strings are byte strings in no particular encoding; paths have no trailing slash.

@@ -14,7 +14,7 @@ namespace {
 constexpr std::string_view kOpeningTag = "<MT>";
 constexpr std::string_view kClosingTag = "</MT>";
 
-// An entry is always at this position, wherever the tag is.
+// The entry is read from this column, even if the tag is elsewhere on the line.
 constexpr std::size_t kEntryPosition = 4;
 constexpr std::size_t kEntryLength = 4;
 
