@@ -7,6 +7,7 @@ endmacro()
 
 put(programs /opt/ruv)
 put(documents /usr)
+put(system /usr)
 put(settings /)
 if(CPACK_GENERATOR STREQUAL "DEB")
   put(debian /usr)

@@ -1,5 +1,6 @@
 # The packages (.deb, .rpm): the programs in /opt/ruv, everything else in the system's directories. scripts/package builds
 # and checks them, and makes the archive.
+set(RUV_PACKAGE_RELEASE 1 CACHE STRING "What follows the version of the packages")
 set(CPACK_GENERATOR DEB RPM)
 set(CPACK_PROJECT_CONFIG_FILE ${PROJECT_SOURCE_DIR}/cmake/package_components.cmake)
 set(CPACK_PACKAGING_INSTALL_PREFIX /)
@@ -19,7 +20,7 @@ package tool and its helper script are not part of this package.")
 set(CPACK_PACKAGE_HOMEPAGE_URL ${RUV_DOWNLOAD_URL})
 
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
-set(CPACK_DEBIAN_PACKAGE_RELEASE 1)
+set(CPACK_DEBIAN_PACKAGE_RELEASE ${RUV_PACKAGE_RELEASE})
 set(CPACK_DEBIAN_PACKAGE_SECTION admin)
 set(CPACK_DEBIAN_COMPRESSION_TYPE xz) # dpkg before Debian 12 cannot read zstd
 if(CMAKE_SYSROOT)
@@ -30,10 +31,12 @@ else()
 endif()
 set(CPACK_DEBIAN_PACKAGE_RECOMMENDS logrotate)
 set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
-set(CPACK_DEBIAN_PACKAGE_CONTROL_EXTRA ${PROJECT_SOURCE_DIR}/packaging/postinst
-  ${PROJECT_SOURCE_DIR}/packaging/prerm ${PROJECT_SOURCE_DIR}/packaging/debian/conffiles)
+set(CPACK_DEBIAN_PACKAGE_CONTROL_EXTRA
+  ${PROJECT_SOURCE_DIR}/packaging/debian/preinst ${PROJECT_SOURCE_DIR}/packaging/debian/conffiles
+  ${PROJECT_SOURCE_DIR}/packaging/postinst ${PROJECT_SOURCE_DIR}/packaging/postrm)
 
 set(CPACK_RPM_FILE_NAME RPM-DEFAULT)
+set(CPACK_RPM_PACKAGE_RELEASE ${RUV_PACKAGE_RELEASE})
 set(CPACK_RPM_PACKAGE_ARCHITECTURE ${CMAKE_SYSTEM_PROCESSOR})
 set(CPACK_RPM_PACKAGE_DESCRIPTION ${CPACK_PACKAGE_DESCRIPTION})
 set(CPACK_RPM_PACKAGE_SUMMARY "Launcher for the RUV server diagnostics")
@@ -42,16 +45,18 @@ set(CPACK_RPM_PACKAGE_GROUP System)
 set(CPACK_PACKAGE_RELOCATABLE OFF)
 string(TIMESTAMP changelog_date "%a %b %d %Y" UTC)
 file(WRITE ${PROJECT_BINARY_DIR}/changelog.rpm
-"* ${changelog_date} ${RUV_MAINTAINER} - ${PROJECT_VERSION}-1
+"* ${changelog_date} ${RUV_MAINTAINER} - ${PROJECT_VERSION}-${RUV_PACKAGE_RELEASE}
 - See CHANGELOG.md for the changes.
 ")
 set(CPACK_RPM_CHANGELOG_FILE ${PROJECT_BINARY_DIR}/changelog.rpm)
 set(CPACK_RPM_POST_INSTALL_SCRIPT_FILE ${PROJECT_SOURCE_DIR}/packaging/postinst)
-set(CPACK_RPM_PRE_UNINSTALL_SCRIPT_FILE ${PROJECT_SOURCE_DIR}/packaging/prerm)
-set(CPACK_RPM_USER_FILELIST "%config(noreplace) /etc/logrotate.d/ruv-launcher")
-# Directories that belong to other packages.
+set(CPACK_RPM_POST_UNINSTALL_SCRIPT_FILE ${PROJECT_SOURCE_DIR}/packaging/postrm)
+set(CPACK_RPM_USER_FILELIST
+  "%config(noreplace) /etc/default/ruv-launcher" "%config(noreplace) /etc/logrotate.d/ruv-launcher")
+# Directories that belong to other packages or, below /opt, to the application.
 set(CPACK_RPM_EXCLUDE_FROM_AUTO_FILELIST_ADDITION
-  /etc/logrotate.d /opt /usr/lib/systemd /usr/lib/systemd/system /usr/lib/tmpfiles.d /usr/share/bash-completion
+  /etc/default /etc/logrotate.d /opt /opt/ruv /opt/ruv/bin /usr/lib/systemd /usr/lib/systemd/system
+  /usr/lib/systemd/system-preset /usr/lib/tmpfiles.d /usr/share/bash-completion
   /usr/share/bash-completion/completions /usr/share/man /usr/share/man/man8 /usr/share/zsh
   /usr/share/zsh/site-functions)
 # rpm before 4.12 (RHEL 7, SLES 12) ignores Recommends and reads gzip, not zstd. The other lines make the
