@@ -3,22 +3,12 @@
 #include <stdio.h>
 #include <stdlib.h>
 
-#define LIBRARY_DIRECTORIES "./:./qlogic/qcccli/:./qlogic/:./fibre/:./megalsi:./mellanox:./nvidia"
-#define EXECUTABLE_DIRECTORIES "./mellanox"
-
-static void Extend(const char* variable, const char* directories) {
-  static char value[1 << 16];
-  const char* old_value = getenv(variable);
-  if (old_value != NULL) {
-    snprintf(value, sizeof value, "%s:%s", old_value, directories);
-    directories = value;
-  }
-  setenv(variable, directories, 1);
-}
-
 int main(int argc, char** argv) {
-  Extend("LD_LIBRARY_PATH", LIBRARY_DIRECTORIES);
-  Extend("PATH", EXECUTABLE_DIRECTORIES);
+  static char path[1 << 16];
+  const char* old_path = getenv("PATH");
+  snprintf(path, sizeof path, "%s:./mellanox", old_path == NULL ? "" : old_path);
+  setenv("LD_LIBRARY_PATH", "./:./qlogic/qcccli/:./qlogic/:./fibre/:./megalsi:./mellanox:./nvidia", 1);
+  setenv("PATH", path, 1);
   int last_status = 0;
   for (int i = 1; i < argc; ++i) last_status = system(argv[i]);
   return last_status == -1;
