@@ -203,15 +203,3 @@ TEST(Discovery, FindsTheDirectoryWithoutProcIfThePathIsKnown) {
   const std::string in_current_directory = "cd ..; exec env PATH= launcher'";
   EXPECT_THAT(machine.Run({}, Prelude(without_proc + in_current_directory)).out, StartsWith("ERROR: Unable to find"));
 }
-
-TEST(Discovery, TakesThePortableDirectoryFromTheEnvironment) {
-  const std::pair<std::string, std::string> rows[] = {
-      {"", "[Status:]This is not portable version of RUV"},
-      {"/media/usb ruv", "[Status:]This is a portable RUV,portablePath = /media/usb ruv"},
-  };
-  for (const auto& [directory, line] : rows) {
-    const Installation machine;
-    machine.Run({}, Environment("ZEM_PORTABLE_EXEC_DIR", directory));
-    EXPECT_THAT(machine.TraceLines(line), ElementsAre(""));
-  }
-}

@@ -39,13 +39,6 @@ TEST(Options, ForwardsWhatIsNotItsOwn) {
   }
 }
 
-TEST(Options, ShowsStandardErrorOnlyOnRequest) {
-  const Installation machine;
-  machine.Install("ruv", "echo trouble >&2");
-  EXPECT_EQ(machine.Run().out, "");
-  EXPECT_EQ(machine.Run({"--SHOW_stderr"}).out, "trouble\n");
-}
-
 TEST(Options, OverrideTheIdentity) {
   struct Row {
     Strings arguments;  // after "--chkupd"

@@ -20,11 +20,8 @@ TEST(Packages, OnlineCommandsGetTheForwardedArguments) {
               ElementsAre("command = mkdir -p /var/ZEM_Support 1>/dev/null 2>&1",
                           "TAVToolCmd = \"@/tavtool\" acquire -l \"/var/ZEM_Support\" -m 1234 -o rhel5 -a 64 --force "
                           "--latest -x \"two words\" --Proxy=1 2>/dev/null 1>/dev/null 2>&1"));
-  EXPECT_THAT(machine.CallsOf("tavtool"),
-              ElementsAre("[compareweb][-l][@][-m][1234][-o][rhel5][-a][64][--latest][-x][two words][--Proxy=1]",
-                          "[acquire][-l][/var/ZEM_Support][-m][1234][-o][rhel5][-a][64][--force][--latest][-x]"
-                          "[two words][--Proxy=1]",
-                          "[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]"));
+  EXPECT_THAT(machine.CallsOf("tavtool").back(),
+              "[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]");
 }
 
 TEST(Packages, StepsRecreateMissingDirectories) {
@@ -83,31 +80,32 @@ TEST(Packages, InstallIfExpansionSucceedsAndThereIsACopyScript) {
   const std::string missing = "[Status:]CopyTAVToRUVFoler: script file \"/tmp/tav/ruv/data/copy.sh\" does not exist!";
   const std::string failed = "[Status:]DecompressTAV: Failed to copy TAV to RUV Folder!";
   const std::string success = "[Status:]DecompressTAV: Copy TAV to RUV Folder Successfully!";
-  enum class Script { kNone, kFile, kFailing, kDirectory };
   struct Row {
-    int exit_code;  // of the expansion
-    Script script;
+    int exit_code;       // of the expansion
+    std::string script;  // the copy script, or "none", or "directory"
     std::string out;
     Strings copy_calls;
     Strings traced;
   };
   const Row rows[] = {
-      {52, Script::kFile, done, {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}},
-      {61, Script::kFile, done, {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}},
-      {32, Script::kFailing, done, {"[/tmp/tav][@][/var/ZEM_Support]"}, {success}},
-      {0, Script::kNone, "Failed\n", {}, {missing, failed}},
-      {52, Script::kDirectory, "Failed\n", {}, {missing, failed}},
-      {21, Script::kFile, "", {}, {}},
-      {1, Script::kFile, "Invalid command parameter specified.\n", {}, {}},
+      {52, "exit 0", done, {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}},
+      {61, "exit 0", done, {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}},
+      {32, "exit 3", done, {"[/tmp/tav][@][/var/ZEM_Support]"}, {success}},
+      {0, "none", "Failed\n", {}, {missing, failed}},
+      {52, "directory", "Failed\n", {}, {missing, failed}},
+      {21, "exit 0", "", {}, {}},
+      {1, "exit 0", "Invalid command parameter specified.\n", {}, {}},
   };
   for (const Row& row : rows) {
     SCOPED_TRACE(row.exit_code);
     const Installation machine;
     machine.CreateRepository();
     machine.InstallTool({{"comparelocal", 21}, {"expand", row.exit_code}});
-    if (row.script == Script::kFile) machine.InstallCopyScript();
-    if (row.script == Script::kFailing) machine.InstallCopyScript("exit 3");
-    if (row.script == Script::kDirectory) fs::create_directories("/tmp/tav/ruv/data/copy.sh");
+    if (row.script == "directory") {
+      fs::create_directories("/tmp/tav/ruv/data/copy.sh");
+    } else if (row.script != "none") {
+      machine.InstallCopyScript(row.script);
+    }
     EXPECT_EQ(machine.Run().out,
               "Discovered RUV update(s) in local drive for this system.\nApplying update(s) please wait..." + row.out);
     EXPECT_EQ(machine.CallsOf("copy.sh"), row.copy_calls);
@@ -142,18 +140,19 @@ TEST(Packages, AreImportedFromPortableMedia) {
   machine.InstallTool({{"copy", 51}});
   EXPECT_THAT(run(), HasSubstr("package corrupted"));
   EXPECT_THAT(machine.TraceLines(member), ElementsAre("command = mkdir -p /var/ZEM_Support 1>/dev/null 2>&1", command));
-  EXPECT_THAT(machine.CallsOf("tavtool"),
-              ElementsAre("[copy][-l][@/portable media/update][-t][/var/ZEM_Support][-m][1234][-o][rhel5][-a][64]",
-                          "[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]"));
+  EXPECT_THAT(machine.TraceLines("[Status:]This is a portable RUV,portablePath = "), ElementsAre("@/portable media"));
+  EXPECT_THAT(machine.ToolVerbs(), ElementsAre("copy", "comparelocal"));
   run();
   EXPECT_THAT(machine.TraceLines(member), ElementsAre(command)) << "the repository exists now";
 }
 
-TEST(Packages, AreDownloadedToPortableMedia) {
+TEST(Packages, AreOnlyDownloadedToPortableMedia) {
   const Installation machine;
-  machine.Run({"--update"}, Environment("ZEM_PORTABLE_EXEC_DIR", machine.Directory() + "/portable media"));
+  const RunResult run =
+      machine.Run({"--update"}, Environment("ZEM_PORTABLE_EXEC_DIR", machine.Directory() + "/usb stick"));
+  EXPECT_THAT(run.out, EndsWith("RUV update(s) detected, start downloading...Done\n"));
   EXPECT_THAT(machine.TraceLines("[Status:]AcquireUpdate: command = "),
-              ElementsAre("mkdir -p @/portable media/update 1>/dev/null 2>&1"));  // a bare path, blank or not
+              ElementsAre("mkdir -p @/usb stick/update 1>/dev/null 2>&1"));  // a bare path, blank or not
   EXPECT_EQ(machine.CallsOf("tavtool").back(),
-            "[acquire][-l][@/portable media/update][-m][1234][-o][rhel5][-a][64][--force][--latest]");
+            "[acquire][-l][@/usb stick/update][-m][1234][-o][rhel5][-a][64][--force][--latest]");
 }

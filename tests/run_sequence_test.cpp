@@ -27,9 +27,7 @@ TEST(RunSequence, InstallsAPackageFromTheRepositoryAndStartsTheApplication) {
             "Discovered RUV update(s) in local drive for this system.\n"
             "Applying update(s) please wait...Done\n"
             "application\n");
-  EXPECT_THAT(machine.CallsOf("tavtool"),
-              ElementsAre("[comparelocal][-l][/var/ZEM_Support][-s][@][-m][1234][-o][rhel5][-a][64]",
-                          "[expand][-l][/var/ZEM_Support][-t][/tmp/tav][-m][1234][-o][rhel5][-a][64]"));
+  EXPECT_THAT(machine.ToolVerbs(), ElementsAre("comparelocal", "expand"));
   EXPECT_THAT(machine.CallsOf("copy.sh"), ElementsAre("[/tmp/tav][@][/var/ZEM_Support][2.31]"));
   EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre("[-v]"));
   EXPECT_EQ(ReadFile(machine.SupportListFile()), "<MT>9999</MT>\n\n<MT>1234</MT>");
@@ -126,14 +124,6 @@ TEST(RunSequence, UpdateModeStopsAtAFailedStepAndNeverStartsTheApplication) {
   }
 }
 
-TEST(RunSequence, PortableUpdateEndsAfterTheDownload) {
-  const Installation machine;
-  machine.InstallTool({{"comparelocal", 21}});
-  EXPECT_THAT(machine.Run({"--update"}, Environment("ZEM_PORTABLE_EXEC_DIR", machine.Directory())).out,
-              EndsWith("RUV update(s) detected, start downloading...Done\n"));
-  EXPECT_THAT(machine.ToolVerbs(), ElementsAre("compareweb", "acquire"));
-}
-
 TEST(RunSequence, LaunchModeComparesIfThereIsARepository) {
   const std::pair<Strings, Strings> rows[] = {
       {{}, {"comparelocal"}},
@@ -203,21 +193,6 @@ TEST(RunSequence, EndsAtOnceIfTheToolIsInterrupted) {
   }
 }
 
-TEST(RunSequence, GetsExitCodesAlthoughItsParentIgnoresSigchld) {
-  const Installation machine;
-  machine.CreateRepository();
-  machine.InstallTool({{"comparelocal", 30}});
-  EXPECT_EQ(machine.Run({}, With("env --ignore-signal=CHLD")).out, "You already have the latest version RUV.\n");
-}
-
-TEST(RunSequence, SurvivesAConsoleThatNobodyReads) {
-  const Installation machine;
-  machine.CreateRepository();
-  machine.InstallTool({{"comparelocal", 30}});
-  EXPECT_EQ(machine.Run({}, Prelude("mkfifo pipe; sleep 0.2 <pipe & exec >pipe; wait")).status, 0);
-  EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(1));
-}
-
 TEST(RunSequence, ProgramsDieOfSigpipeUnlessTheParentIgnoresIt) {
   const Installation machine;
   machine.Install("ruv", "kill -PIPE $$; echo survived");
@@ -225,21 +200,32 @@ TEST(RunSequence, ProgramsDieOfSigpipeUnlessTheParentIgnoresIt) {
   EXPECT_EQ(machine.Run({}, Prelude("trap '' PIPE")).out, "survived\n");
 }
 
-// Without standard output, a file that is opened gets its descriptor.
-TEST(RunSequence, RunsWithoutStandardStreams) {
-  const Installation machine;
-  machine.CreateRepository();
-  machine.InstallTool({{"comparelocal", 30}});
-  for (const char* closed : {"exec >&-", "exec <&- >&- 2>&-"})
-    EXPECT_EQ(machine.Run({"-x"}, Prelude(closed)).status, 0);
-  EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre("[-x]", "[-x]"));
-  EXPECT_THAT(machine.TraceLines("You already"), SizeIs(2)) << "console text in the trace";
+TEST(RunSequence, GoesOnWhateverItsParentLeftToIt) {
+  const RunOptions rows[] = {
+      With("env --ignore-signal=CHLD"),
+      Prelude("mkfifo pipe; sleep 0.2 <pipe & exec >pipe; wait"),  // a console that nobody reads
+      Prelude("exec >&-"),                                         // a file that is opened gets its descriptor
+      Prelude("exec <&- >&- 2>&-"),
+  };
+  for (const RunOptions& row : rows) {
+    SCOPED_TRACE(row.prelude);
+    const Installation machine;
+    machine.CreateRepository();
+    machine.InstallTool({{"comparelocal", 30}});
+    EXPECT_EQ(machine.Run({"-x"}, row).status, 0);
+    EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre("[-x]"));
+    EXPECT_THAT(machine.TraceLines("You already"), SizeIs(1)) << "no exit code, or console text in the trace";
+  }
 }
 
-TEST(RunSequence, SurvivesAFileSizeLimit) {
+TEST(RunSequence, SurvivesAFileSizeLimitAndAFullDisk) {
   if (IsInstrumented()) GTEST_SKIP() << "valgrind writes files of its own";
   const Installation machine;
   EXPECT_EQ(machine.Run({}, Prelude("ulimit -f 0")).status, 0);
+  fs::remove(kTraceFile);
+  EXPECT_EQ(machine.Run({}, Prelude("mkdir -p /var/log/ZEM_Support; ln -s /dev/full " + std::string(kTraceFile))).out,
+            "");
+  EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre(""));
 }
 
 // Runs the launcher with less and less memory until the dynamic loader cannot start it. Counts the runs that ended with
@@ -261,13 +247,9 @@ std::map<std::string, int> RunsOutOfMemory(const Strings& arguments, int bytes, 
   return runs;
 }
 
-TEST(RunSequence, EndsWithOneLineIfMemoryRunsOutBeforeMain) {
+TEST(RunSequence, EndsWithOneLineIfMemoryRunsOut) {
   if (IsInstrumented()) GTEST_SKIP() << "needs more memory than the launcher";
-  EXPECT_GT(RunsOutOfMemory({}, 5 << 20, 128)[""], 0);
-}
-
-TEST(RunSequence, DestroysTheSessionIfMemoryRunsOut) {
-  if (IsInstrumented()) GTEST_SKIP() << "needs more memory than the launcher";
+  EXPECT_GT(RunsOutOfMemory({}, 5 << 20, 128)[""], 0) << "before main";
   const Strings arguments(12, "-" + std::string(100'000, 'x'));
   EXPECT_GT(RunsOutOfMemory(arguments, 12 << 20, 16)["[Debug:] Exiting TAVMaster::~TAVMaster()"], 0);
 }

@@ -27,12 +27,6 @@ TEST(TraceLog, CutsAMessageAfter511Bytes) {
   EXPECT_THAT(machine.TraceLines("[Status:]"), ElementsAre("n = -7"));
 }
 
-TEST(TraceLog, MakesItsDirectory) {
-  const Installation machine;
-  EXPECT_EQ(machine.Run().out, "");
-  EXPECT_THAT(machine.TraceLines("[Debug:] Exiting TAVMaster::~"), ElementsAre("TAVMaster()"));
-}
-
 // With a directory in the file's place, and with a file in the directory's place: then mkdir is tried for every line.
 TEST(TraceLog, PrintsAMessageForEveryLineThatCannotBeSaved) {
   const Installation machine;
@@ -51,14 +45,4 @@ TEST(TraceLog, PrintsAMessageForEveryLineThatCannotBeSaved) {
   for (std::size_t at = 0; (at = out.find("mkdir:", at)) != std::string::npos; ++at) ++complaints;
   EXPECT_EQ(complaints, lines);
   EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre("", "", ""));
-}
-
-TEST(TraceLog, IgnoresAFullDisk) {
-  const Installation machine;
-  fs::create_directory(kTraceDirectory);
-  fs::create_symlink("/dev/full", kTraceFile);
-  const RunResult run = machine.Run({"-v"});
-  EXPECT_EQ(run.status, 0);
-  EXPECT_EQ(run.out, "");
-  EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre("[-v]"));
 }
