@@ -6,73 +6,62 @@ endif()
 
 set(documents share/doc/ruv-launcher)
 
-# Adds a target that writes a compressed copy of a file into the build tree, and sets variable to its path.
-function(ruv_compress file variable)
+# Compressed copies, in the build tree.
+string(TIMESTAMP build_time "%a, %d %b %Y %H:%M:%S +0000" UTC)
+configure_file(packaging/debian/changelog.in changelog.Debian @ONLY)
+foreach(file man/ruv-launcher.8 man/ruv-trace.8 CHANGELOG.md ${PROJECT_BINARY_DIR}/changelog.Debian)
   get_filename_component(name ${file} NAME)
-  set(compressed ${PROJECT_BINARY_DIR}/compressed/${name}.gz)
-  file(MAKE_DIRECTORY ${PROJECT_BINARY_DIR}/compressed)
-  add_custom_command(OUTPUT ${compressed} DEPENDS ${file} VERBATIM
-    COMMAND sh -c [[gzip -9nc "$1" >"$2"]] sh ${file} ${compressed})
-  add_custom_target(compressed_${name} ALL DEPENDS ${compressed})
-  set(${variable} ${compressed} PARENT_SCOPE)
-endfunction()
+  execute_process(COMMAND gzip -9nc ${file} WORKING_DIRECTORY ${PROJECT_SOURCE_DIR}
+                  OUTPUT_FILE ${PROJECT_BINARY_DIR}/${name}.gz)
+  set_property(DIRECTORY APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS ${file})
+endforeach()
 
-# The notices of the libraries that are linked statically are those of the Debian packages they come from.
+# The notices of the libraries that are linked statically come from the Debian package.
 file(READ LICENSE copyright)
 set(notices ${CMAKE_SYSROOT}/usr/share/doc/nlohmann-json3-dev/copyright)
 if(EXISTS ${notices})
   file(READ ${notices} notices)
   string(APPEND copyright "
-The programs also contain parts of the GNU C++ run-time library, which the GCC
-Runtime Library Exception allows in programs of any licence, and ruv-trace
-contains nlohmann-json, whose Debian package describes its sources as follows:
+The programs contain parts of the GNU C++ run-time library, which the GCC Runtime
+Library Exception allows in programs of any licence. ruv-trace also contains
+nlohmann-json, whose Debian package describes its sources as follows:
 
 ${notices}")
 endif()
 file(WRITE ${PROJECT_BINARY_DIR}/copyright "${copyright}")
 
-ruv_compress(${PROJECT_SOURCE_DIR}/man/ruv-launcher.8 manual)
 install(TARGETS launcher RUNTIME DESTINATION . COMPONENT programs)
-install(FILES ${manual} DESTINATION share/man/man8 COMPONENT documents)
+install(FILES ${PROJECT_BINARY_DIR}/ruv-launcher.8.gz DESTINATION share/man/man8 COMPONENT documents)
 if(TARGET ruv-trace)
-  ruv_compress(${PROJECT_SOURCE_DIR}/man/ruv-trace.8 manual)
   install(TARGETS ruv-trace RUNTIME DESTINATION bin COMPONENT programs)
-  install(FILES ${manual} DESTINATION share/man/man8 COMPONENT documents)
+  install(FILES ${PROJECT_BINARY_DIR}/ruv-trace.8.gz DESTINATION share/man/man8 COMPONENT documents)
 endif()
 install(FILES docs/administrator.md RENAME README.md DESTINATION ${documents} COMPONENT documents)
 install(FILES docs/security.md ${PROJECT_BINARY_DIR}/copyright DESTINATION ${documents} COMPONENT documents)
 
-# In /usr of a system that has the package.
+# Installs a file in the packages only: component system (/usr), generic or debian (the same, in one of them) or settings
+# (/). More arguments can set its permissions.
+function(ruv_package component file path)
+  get_filename_component(directory ${path} DIRECTORY)
+  get_filename_component(name ${path} NAME)
+  install(FILES ${file} RENAME ${name} DESTINATION ${directory} COMPONENT ${component} EXCLUDE_FROM_ALL ${ARGN})
+endfunction()
+
 foreach(program launcher ruv-trace)
-  install(FILES completions/${program}.bash RENAME ${program} DESTINATION share/bash-completion/completions
-          COMPONENT system EXCLUDE_FROM_ALL)
-  install(FILES completions/${program}.zsh RENAME _${program} DESTINATION share/zsh/site-functions
-          COMPONENT generic EXCLUDE_FROM_ALL)
-  install(FILES completions/${program}.zsh RENAME _${program} DESTINATION share/zsh/vendor-completions
-          COMPONENT debian EXCLUDE_FROM_ALL)
+  ruv_package(system completions/${program}.bash share/bash-completion/completions/${program})
+  ruv_package(generic completions/${program}.zsh share/zsh/site-functions/_${program})
+  ruv_package(debian completions/${program}.zsh share/zsh/vendor-completions/_${program})
 endforeach()
-install(FILES packaging/tmpfiles.conf RENAME ruv-launcher.conf DESTINATION lib/tmpfiles.d
-        COMPONENT system EXCLUDE_FROM_ALL)
-install(FILES packaging/ruv-launcher.service packaging/ruv-launcher.timer DESTINATION lib/systemd/system
-        COMPONENT system EXCLUDE_FROM_ALL)
-install(FILES packaging/ruv-launcher.preset RENAME 80-ruv-launcher.preset DESTINATION lib/systemd/system-preset
-        COMPONENT system EXCLUDE_FROM_ALL)
-install(PROGRAMS packaging/make-directories DESTINATION lib/ruv-launcher COMPONENT system EXCLUDE_FROM_ALL)
-
-# In /etc. The arguments can contain passwords.
-install(FILES packaging/logrotate.conf RENAME ruv-launcher DESTINATION etc/logrotate.d
-        COMPONENT settings EXCLUDE_FROM_ALL)
-install(FILES packaging/default RENAME ruv-launcher DESTINATION etc/default PERMISSIONS OWNER_READ OWNER_WRITE
-        COMPONENT settings EXCLUDE_FROM_ALL)
-
-# The same file, under Debian's name for it and another one.
-install(FILES CHANGELOG.md DESTINATION ${documents} COMPONENT generic EXCLUDE_FROM_ALL)
-ruv_compress(${PROJECT_SOURCE_DIR}/CHANGELOG.md changelog)
-install(FILES ${changelog} RENAME changelog.gz DESTINATION ${documents} COMPONENT debian EXCLUDE_FROM_ALL)
-
-string(TIMESTAMP build_time "%a, %d %b %Y %H:%M:%S +0000" UTC)
-configure_file(packaging/debian/changelog.in changelog.Debian @ONLY)
-ruv_compress(${PROJECT_BINARY_DIR}/changelog.Debian debian_changelog)
-install(FILES ${debian_changelog} DESTINATION ${documents} COMPONENT debian EXCLUDE_FROM_ALL)
-install(FILES packaging/debian/lintian-overrides RENAME ruv-launcher DESTINATION share/lintian/overrides
-        COMPONENT debian EXCLUDE_FROM_ALL)
+ruv_package(system packaging/make-directories lib/ruv-launcher/make-directories PERMISSIONS
+  OWNER_READ OWNER_WRITE OWNER_EXECUTE GROUP_READ GROUP_EXECUTE WORLD_READ WORLD_EXECUTE)
+ruv_package(system packaging/tmpfiles.conf lib/tmpfiles.d/ruv-launcher.conf)
+ruv_package(system packaging/ruv-launcher.service lib/systemd/system/ruv-launcher.service)
+ruv_package(system packaging/ruv-launcher.timer lib/systemd/system/ruv-launcher.timer)
+ruv_package(system packaging/ruv-launcher.preset lib/systemd/system-preset/80-ruv-launcher.preset)
+ruv_package(settings packaging/logrotate.conf etc/logrotate.d/ruv-launcher)
+# The arguments can contain passwords.
+ruv_package(settings packaging/default etc/default/ruv-launcher PERMISSIONS OWNER_READ OWNER_WRITE)
+ruv_package(generic CHANGELOG.md ${documents}/CHANGELOG.md)
+ruv_package(debian ${PROJECT_BINARY_DIR}/CHANGELOG.md.gz ${documents}/changelog.gz)
+ruv_package(debian ${PROJECT_BINARY_DIR}/changelog.Debian.gz ${documents}/changelog.Debian.gz)
+ruv_package(debian packaging/debian/lintian-overrides share/lintian/overrides/ruv-launcher)
