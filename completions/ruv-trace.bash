@@ -2,7 +2,7 @@
 _ruv_trace() {
   local current=${COMP_WORDS[COMP_CWORD]}
   if [[ $current == -* ]]; then
-    mapfile -t COMPREPLY < <(compgen -W '--problems --long --json --check --show-passwords -h --help --version' \
+    mapfile -t COMPREPLY < <(compgen -W '--problems --long --json --check --max-age= --show-passwords -h --help --version' \
       -- "$current")
   else
     compopt -o filenames

@@ -2,9 +2,7 @@
 
 #include <algorithm>
 #include <nlohmann/json.hpp>
-#include <optional>
-
-#include "passwords.h"
+#include <regex>
 
 namespace ruv_trace {
 namespace {
@@ -13,168 +11,127 @@ using Json = nlohmann::ordered_json;
 
 constexpr std::size_t kLineWidth = 80;
 
-std::string JsonText(const Json& json) { return json.dump(-1, ' ', false, Json::error_handler_t::replace); }
-
-template <typename Text>
-Json OrNull(const std::optional<Text>& text) {
-  return text ? Json(*text) : Json();
+// Returns JSON in printable ASCII.
+std::string JsonText(const Json& json) {
+  std::string text = json.dump(-1, ' ', true, Json::error_handler_t::replace);
+  for (std::size_t at = 0; (at = text.find('\x7F', at)) != std::string::npos;) text.replace(at, 1, "\\u007f");
+  return text;
 }
 
-Json UnlessEmpty(const std::string& text) { return text.empty() ? Json() : Json(text); }
-
-std::string Shown(const Command& command, bool show_passwords) {
-  return show_passwords ? command.text : WithoutPasswords(command.text);
+// Hides everything after the first option whose value contains a password, up to the redirections: the trace does not
+// show where the value ends. The user's options begin at the given position.
+std::string Shown(const std::string& text, bool show_passwords, std::size_t begin = 0) {
+  static const std::regex kPassword(R"(((?:|[\s\S]*?[\s"'])(?:-t|--ipmi-lan|--vmware-esxi|--remote-zfld|--proxy-password|)"
+                                    R"(--proxy-user(?=[\s\S]*:)|--proxy-address(?=[\s\S]*@)))(?![a-z0-9])[\s\S]*?)"
+                                    R"(((?: 2>/dev/null| 1>/dev/null| 1>tav\.log| 2>&1)*))",
+                                    std::regex::icase);
+  std::smatch parts;
+  if (show_passwords || begin >= text.size()) return text;
+  const std::string options = text.substr(begin);
+  if (!std::regex_match(options, parts, kPassword)) return text;
+  return text.substr(0, begin) + parts.str(1) + " ***" + parts.str(2);
 }
 
-Json JsonCalls(const Run& run, bool show_passwords) {
-  Json calls = Json::array();
-  for (const ToolCall& call : run.Known().calls) {
-    calls.push_back({{"verb", call.verb},
-                     {"exit_code", OrNull(call.exit_code)},
-                     {"result", !call.exit_code ? kUnknown
-                                : call.Failed() ? kProblem
-                                                : kOk},
-                     {"meaning", call.Meaning()},
-                     {"command", Shown(call.command, show_passwords)},
-                     {"command_cut", call.command.MayBeCut()}});
-  }
-  return calls;
+std::string Shown(const ToolCall& call, bool show_passwords) {
+  return Shown(call.command.text, show_passwords, call.command.text.find("\" -m "));
 }
 
-// True if the character moves or hides text: DEL, C1, zero-width, text-direction and line-separator characters.
-bool IsControl(std::string_view character) {
-  return character == "\x7F" || (character >= "\xC2\x80" && character < "\xC2\xA0") || character == "\xD8\x9C" ||
-         (character >= "\xE2\x80\x8B" && character <= "\xE2\x80\x8F") ||
-         (character >= "\xE2\x80\xA8" && character < "\xE2\x80\xAF") ||
-         (character > "\xE2\x81\xA5" && character < "\xE2\x81\xAA");
+std::string Cell(const std::string& text, std::size_t width) {
+  if (text.size() > width) return text.substr(0, width - 3) + "...";
+  return text + std::string(width - text.size(), ' ');
 }
 
-bool StartsCharacter(char byte) { return (static_cast<unsigned char>(byte) & 0xC0U) != 0x80U; }
-
-// Returns the length of the character at the beginning of valid UTF-8.
-std::size_t CharacterLength(std::string_view text) {
-  std::size_t length = 1;
-  while (length < text.size() && !StartsCharacter(text[length])) ++length;
-  return length;
-}
-
-std::size_t Width(std::string_view text) {
-  return static_cast<std::size_t>(std::count_if(text.begin(), text.end(), StartsCharacter));
-}
-
-// Returns the text cut or padded to the width.
-std::string Cell(std::string text, std::size_t width) {
-  if (Width(text) > width) {
-    while (Width(text) > width - 3) text.pop_back();
-    return text + "...";
-  }
-  return text + std::string(width - Width(text), ' ');
-}
-
-std::string InWords(std::string_view value) {
-  std::string words(value);
-  std::replace(words.begin(), words.end(), '_', ' ');
-  return words;
+std::string InWords(std::string value) {
+  std::replace(value.begin(), value.end(), '_', ' ');
+  return value;
 }
 
 // Returns the reason or, without one, the package; and then, if it is certain, whether ruv was started.
 std::string Outcome(const Run& run, std::size_t width) {
-  const Facts& known = run.Known();
-  std::string text = Judge(run).reason;
-  if (text.empty()) {
-    text = (known.package_version.empty() ? "package" : known.package_version) + ": " + InWords(known.package);
-  }
-  text = Printable(text);
-  std::string ruv = known.application == kUnknown ? "" : "; ruv " + InWords(known.application);
+  const std::string package = run.package_version.empty() ? "package" : run.package_version;
+  std::string text = Printable(run.Reason().empty() ? package + ": " + InWords(run.package) : run.Reason());
+  std::string ruv = run.ruv == "unknown" ? "" : "; ruv " + InWords(run.ruv);
   // Only launch mode starts ruv: in the other modes this part may be dropped to save space.
-  if (known.mode != kLaunchMode && Width(text) + ruv.size() > width) ruv.clear();
-  if (Width(text) + ruv.size() > width) text = Cell(text, width - ruv.size());
+  if (run.mode != "launch" && text.size() + ruv.size() > width) ruv.clear();
+  if (text.size() + ruv.size() > width) text = Cell(text, width - ruv.size());
   return text + ruv;
 }
 
-}  // namespace
+std::string OrUnknown(const std::string& text) { return text.empty() ? "?" : text; }
+Json OrNull(const std::string& text) { return text.empty() ? Json() : Json(text); }
 
-Verdict Judge(const Run& run) {
-  const std::string problem = run.Problem();
-  if (!problem.empty()) return {kProblem, problem};
-  const std::string unclear = run.Unclear();
-  if (!unclear.empty()) return {kUnknown, unclear};
-  return {kOk, ""};
-}
+}  // namespace
 
 std::string TableHeader() { return "RUN VERDICT MACHINE DID    PACKAGE AND RUV, OR WHAT IS WRONG\n"; }
 
 std::string TableLine(const Run& run) {
   const std::string number = std::to_string(run.number);
-  const std::string machine = Printable(run.Machine().machine_type.value_or("?"));
-  const std::string mode = run.Known().mode == kUnknown ? "?" : std::string(run.Known().mode);
   const std::string columns = std::string(number.size() < 3 ? 3 - number.size() : 0, ' ') + number + " " +
-                              Cell(std::string(Judge(run).word), 7) + " " + Cell(machine, 7) + " " + Cell(mode, 6) +
-                              " ";
-  return columns + Outcome(run, kLineWidth - Width(columns)) + "\n";
+                              Cell(run.Verdict(), 7) + " " + Cell(Printable(OrUnknown(run.machine_type)), 7) + " " +
+                              Cell(run.mode == "unknown" ? "?" : run.mode, 6) + " ";
+  return columns + Outcome(run, kLineWidth - columns.size()) + "\n";
 }
 
 std::string Details(const Run& run, bool show_passwords) {
-  const Facts& known = run.Known();
-  const Identity machine = run.Machine();
   std::string text;
   const auto add = [&text](const std::string& line) { text += "      " + Printable(line) + "\n"; };
-  add("line " + std::to_string(run.line) + " of " + run.file + ", machine " + machine.machine_type.value_or("?") + " " +
-      machine.system.value_or("?") + "/" + machine.architecture.value_or("?"));
-  if (const std::string reason = Judge(run).reason; !reason.empty()) add("reason: " + reason);
-  for (const ToolCall& call : known.calls) {
-    add(call.verb + (call.exit_code ? " " + std::to_string(*call.exit_code) : "") + ": " + std::string(call.Meaning()));
-    add("  " + Shown(call.command, show_passwords) + (call.command.MayBeCut() ? "..." : ""));
+  add("line " + std::to_string(run.line) + " of " + run.file + ", machine " + OrUnknown(run.machine_type) + " " +
+      OrUnknown(run.system) + "/" + OrUnknown(run.architecture));
+  if (!run.Reason().empty()) add("reason: " + run.Reason());
+  for (const ToolCall& call : run.calls) {
+    add(call.verb + (call.exit_code
+                         ? " " + std::to_string(*call.exit_code) + ": " + OutcomeOf(call.verb, *call.exit_code).meaning
+                         : ": no exit code"));
+    add("  " + Shown(call, show_passwords) + (call.command.cut ? "..." : ""));
   }
-  if (!known.command.text.empty()) {
-    add("command: " + Shown(known.command, show_passwords) + (known.command.MayBeCut() ? "..." : ""));
+  if (!run.command.text.empty()) {
+    add("command: " + Shown(run.command.text, show_passwords) + (run.command.cut ? "..." : ""));
   }
   return text;
 }
 
 std::string CheckLine(const Run& run) {
-  return std::string(Judge(run).word) + ": " + Outcome(run, std::string::npos) + " (run " + std::to_string(run.number) +
-         ")\n";
+  const std::string number = run.number == 0 ? "" : " (run " + std::to_string(run.number) + ")";
+  return run.Verdict() + ": " + Outcome(run, std::string::npos) + number + "\n";
 }
 
 std::string JsonLine(const Run& run, bool show_passwords) {
-  const Facts& known = run.Known();
-  const Identity machine = run.Machine();
-  const Verdict verdict = Judge(run);
-  const Json json = {{"file", run.file},
-                     {"line", run.line},
-                     {"run", run.number},
-                     {"verdict", verdict.word},
-                     {"reason", UnlessEmpty(verdict.reason)},
-                     {"machine_type", OrNull(machine.machine_type)},
-                     {"operating_system", OrNull(machine.system)},
-                     {"architecture", OrNull(machine.architecture)},
-                     {"mode", known.mode},
-                     {"package", known.package},
-                     {"package_version", UnlessEmpty(known.package_version)},
-                     {"ruv", known.application},
-                     {"command", UnlessEmpty(Shown(known.command, show_passwords))},
-                     {"command_cut", !known.command.text.empty() && known.command.MayBeCut()},
-                     {"tool_calls", JsonCalls(run, show_passwords)}};
-  return json.dump(-1, ' ', true, Json::error_handler_t::replace) + "\n";
+  Json calls = Json::array();
+  for (const ToolCall& call : run.calls) {
+    const ToolOutcome outcome = call.exit_code ? OutcomeOf(call.verb, *call.exit_code) : ToolOutcome{};
+    calls.push_back({{"verb", call.verb},
+                     {"exit_code", call.exit_code ? Json(*call.exit_code) : Json()},
+                     {"result", !call.exit_code  ? "unknown"
+                                : outcome.failed ? "problem"
+                                                 : "ok"},
+                     {"meaning", call.exit_code ? outcome.meaning : "no exit code"},
+                     {"command", Shown(call, show_passwords)},
+                     {"command_cut", call.command.cut}});
+  }
+  return JsonText({{"file", OrNull(run.file)},
+                   {"line", run.line},
+                   {"run", run.number},
+                   {"verdict", run.Verdict()},
+                   {"reason", OrNull(run.Reason())},
+                   {"machine_type", OrNull(run.machine_type)},
+                   {"operating_system", OrNull(run.system)},
+                   {"architecture", OrNull(run.architecture)},
+                   {"mode", run.mode},
+                   {"package", run.package},
+                   {"package_version", OrNull(run.package_version)},
+                   {"ruv", run.ruv},
+                   {"command", OrNull(Shown(run.command.text, show_passwords))},
+                   {"command_cut", run.command.cut},
+                   {"tool_calls", calls}}) +
+         "\n";
 }
 
-std::string Printable(std::string_view text) {
-  // The JSON library escapes control characters and replaces invalid UTF-8. Undoes two of its escapes and escapes a few
-  // more characters.
-  const std::string quoted = JsonText(std::string(text));
-  std::string_view rest = std::string_view(quoted).substr(1, quoted.size() - 2);
+std::string Printable(const std::string& text) {
+  const std::string quoted = JsonText(text);
   std::string printable;
-  while (!rest.empty()) {
-    if (rest[0] == '\\' && (rest[1] == '\\' || rest[1] == '"')) rest.remove_prefix(1);
-    const std::string_view character = rest.substr(0, CharacterLength(rest));
-    if (IsControl(character)) {
-      const std::string escaped = Json(std::string(character)).dump(-1, ' ', true);
-      printable.append(escaped, 1, escaped.size() - 2);
-    } else {
-      printable += character;
-    }
-    rest.remove_prefix(character.size());
+  for (std::size_t i = 1; i + 1 < quoted.size(); ++i) {
+    if (quoted[i] == '\\' && (quoted[i + 1] == '\\' || quoted[i + 1] == '"')) ++i;
+    printable += quoted[i];
   }
   return printable;
 }

@@ -1,134 +1,189 @@
 #include "trace_reader.h"
 
+#include <algorithm>
+#include <sstream>
+
 #include "log/trace_format.h"
 
 namespace ruv_trace {
 namespace {
 
-constexpr std::string_view kPrefix = NZEMRUVTAV::kLinePrefix;
+constexpr std::size_t kMostFollowed = 20;   // an unfinished run with that many after it is given up
+constexpr std::size_t kMostMessages = 500;  // of a run; an ordinary one has about fifty
+constexpr std::size_t kKeptText = 1024;     // of the lines after a message; more than the rest of a command
 
-// After this many runs have ended in sequence, an unfinished one is assumed to have been killed.
-constexpr std::size_t kMostHeld = 20;
-
-constexpr std::string_view kMixed = "mixed with another run, or lines are missing";
-constexpr std::string_view kHeadless = "its beginning is missing";
+bool IsClosing(const std::string& message) {
+  return message == "[Debug:] Exiting TAVMaster::InvokeRUV()" ||
+         message == "[Debug:] Exiting TAVMaster::TAVMasterMain()" ||
+         message == "[Debug:] Entering TAVMaster::~TAVMaster()" || message == kLastMessage;
+}
 
 }  // namespace
+
+bool TraceReader::Followed::Read() {
+  run = Run(run.number, run.file, run.line);
+  return ruv_trace::Read(messages, run, expected);
+}
+
+bool TraceReader::Followed::Fits(const std::string& text) const {
+  return messages.size() < kMostMessages &&
+         std::any_of(expected.begin(), expected.end(), [&](const std::string& each) { return Matches(text, each); });
+}
+
+void TraceReader::Followed::Mix() {
+  mixed = true;
+  for (Followed* rival : rivals) rival->mixed = true;
+}
 
 void TraceReader::BeginFile(const std::string& name) {
   file_ = name;
   line_ = 0;
-  found_runs_ = false;
 }
 
-void TraceReader::TakeLine(std::string_view line) {
+bool TraceReader::Take(const std::string& line) {
   ++line_;
-  const bool prefixed = line.substr(0, kPrefix.size()) == kPrefix;
-  if (prefixed && TakeMessage(line.substr(kPrefix.size()))) return;
-  // A copy script's output may lack a final line feed: then the launcher's line follows on the same line.
-  const std::size_t position = line.rfind(kPrefix);
-  const bool inside = position != std::string_view::npos && position > 0;
-  if (inside && TakeMessage(line.substr(position + kPrefix.size()))) return;
-  if ((prefixed || inside) && !(run_ && run_->RunsCopyScript())) {
-    TakeOutOfTurn(line.substr(position + kPrefix.size()));
-  } else if (run_) {
-    run_->TakeOther(line);
+  const std::string prefix = NZEMRUVTAV::kLinePrefix;
+  // A copy script's output may lack a final line feed: then the launcher's message follows on the same line.
+  const std::size_t position = line.compare(0, prefix.size(), prefix) == 0 ? 0 : line.rfind(prefix);
+  if (position != 0) TakeOther(line.substr(0, position));
+  if (position == std::string::npos) return false;
+  const std::string text = line.substr(position + prefix.size());
+  if (text == kFirstMessage) {
+    CatchUp();
+    Begin();
+    collects_ = true;
+    headless_ = false;
   }
-}
-
-// Returns false if the message is not the next one of the run.
-bool TraceReader::TakeMessage(std::string_view message) {
-  if (message == kFirstMessage) {
-    BeginRun();
-  } else if (run_ && !run_->IsMixed() && run_->Take(message)) {
-    if (run_->Finished()) EndRun();
-  } else {
-    return false;
-  }
-  found_runs_ = true;
+  if (!collects_) return TakeMessage(text);
+  writer_->messages.push_back({text});
+  if (text == kLastMessage || writer_->messages.size() == kMostMessages) CatchUp();
   return true;
 }
 
-void TraceReader::BeginRun() {
-  const bool others_unfinished = unfinished_ > 0;
-  const bool silent_end = run_ && run_->MayHaveEnded() && !run_->IsMixed();
-  silent_ends_ = silent_end ? silent_ends_ + 1 : 0;
-  if (run_ && !silent_end) {
-    // The lines after the application's end are the same in all runs: nothing of the next run can be taken for them.
-    if (run_->IsDoubtful() || !run_->RunsApplication()) left_.push_back(*run_);
-    if (left_.size() > kMostHeld) left_.pop_front();
-    in_turn_ = 0;
-  }
-  if (run_) Hold();
-  run_.emplace(++runs_, file_, line_);
-  run_->Take(kFirstMessage);
-  run_->others_unfinished = others_unfinished;
-  for (const Run& left : left_) run_->BeginBeforeEndOf(left);
-  ++unfinished_;
+void TraceReader::Begin() {
+  followed_.push_back({Run(++runs_, file_, line_)});
+  writer_ = &followed_.back();
 }
 
-void TraceReader::EndRun() {
-  unfinished_ -= 1 + silent_ends_;
-  silent_ends_ = 0;
-  if (run_->IsDoubtful()) left_.clear();
-  if (++in_turn_ == kMostHeld) {
-    left_.clear();
-    unfinished_ = 0;
+// Reads the messages that were collected. If they are those of one run they are read once; if not, one after the other.
+void TraceReader::CatchUp() {
+  if (!collects_) return;
+  collects_ = false;
+  Followed& newest = followed_.back();
+  if (newest.Read()) {
+    for (const Message& message : newest.messages) NoteRivals(newest, message.text);
+  } else {
+    const std::vector<Message> messages = std::move(newest.messages);
+    newest.messages.clear();
+    newest.expected = {kFirstMessage};
+    for (const Message& message : messages) {
+      TakeMessage(message.text);
+      std::istringstream more(message.more);
+      std::string line;
+      for (std::getline(more, line); std::getline(more, line);) TakeOther(line);
+    }
   }
-  Hold();
+  ReportAllBut(kMostFollowed);
 }
 
-// Takes a message that is not the next one of the run: it is another run's, or some are missing before it.
-void TraceReader::TakeOutOfTurn(std::string_view message) {
-  if (!run_ && !Run::Knows(message)) return;
-  const bool others_unfinished = unfinished_ > (run_ ? 1 : 0);
-  // The last lines of a run that was in the application meanwhile say nothing about others.
-  if (!Run::Closes(message) || (run_ && (!others_unfinished || run_->Finished()))) {
-    DoubtAll();
-    found_runs_ = true;
-  }
-  if (message != kLastMessage || unfinished_ == 0 || --unfinished_ > 0) return;
-  left_.clear();
-  if (run_) Hold();
+bool TraceReader::TakeMessage(const std::string& text) {
+  const auto writer =
+      std::find_if(followed_.rbegin(), followed_.rend(), [&](const Followed& each) { return each.Fits(text); });
+  if (writer == followed_.rend()) return TakeStray(text);
+  NoteRivals(*writer, text);
+  if (!IsClosing(text) && !writer->rivals.empty()) writer->Mix();
+  writer->messages.push_back({text});
+  writer->Read();
+  writer_ = &*writer;
+  ReportAllBut(kMostFollowed);
+  return true;
 }
 
-// Nothing is certain of the run, nor of those since an unfinished one: they may have ended with its lines.
-void TraceReader::DoubtAll() {
-  in_turn_ = 0;
-  if (run_) {
-    run_->Doubt(kMixed);
-  } else if (unfinished_ == 0) {
-    ++unfinished_;
-    run_.emplace(++runs_, file_, line_);
-    run_->Doubt(kHeadless);
-  }
-  for (Run& each : held_) {
-    if (each.others_unfinished) each.Doubt(kMixed);
+// Notes that the message, which goes to the writer, fits older runs as well.
+void TraceReader::NoteRivals(Followed& writer, const std::string& text) {
+  for (Followed& older : followed_) {
+    if (&older == &writer || IsClosing(text)) return;
+    if (older.Fits(text)) older.rivals.insert(&writer);
   }
 }
 
-void TraceReader::Hold() {
-  held_.push_back(std::move(*run_));
-  run_.reset();
-  if (held_.size() > kMostHeld) ReportFirst();
+// Takes a message that fits no run. Returns false if it is not one of the launcher's.
+bool TraceReader::TakeStray(const std::string& text) {
+  if (InCopyScript() != nullptr) {
+    TakeOther(text);
+    return true;
+  }
+  const bool is_last = text == kLastMessage;
+  if (IsClosing(text) && given_up_ > 0) {
+    if (is_last) --given_up_;
+    return true;
+  }
+  bool is_explained = headless_;
+  for (Followed& each : followed_) {
+    if (each.expected.empty()) continue;
+    each.Mix();
+    is_explained = true;
+  }
+  if (!is_explained) {
+    if (text.compare(0, 8, "[Debug:]") != 0 && text.compare(0, 9, "[Status:]") != 0) return false;
+    Begin();
+    followed_.back().expected.clear();
+    headless_ = true;
+    ReportAllBut(kMostFollowed);
+  }
+  if (is_last) headless_ = false;
+  return true;
 }
 
-void TraceReader::ReportFirst() {
-  Run& run = held_.front();
-  const Facts& known = run.Known();
-  if (known.package == kCopyScriptRan && !known.copy_command.MayBeCut()) {
-    run.installed_again = known.copy_command.text == installed_ && !known.package_version.empty();
-    installed_ = known.copy_command.text;
-  } else if (known.package == kNothingNewer && known.mode != kCheckMode) {
-    installed_.clear();
-  }
-  report_(run);
-  held_.pop_front();
+// Takes a line without the launcher's prefix: a copy script's output, or the rest of a text with line feeds.
+void TraceReader::TakeOther(const std::string& text) {
+  Followed* writer = InCopyScript();
+  if (writer == nullptr) writer = writer_;
+  if (writer == nullptr || writer->messages.empty()) return;
+  std::string& more = writer->messages.back().more;
+  if (more.size() < kKeptText) more += "\n" + text.substr(0, kKeptText);
+}
+
+// Returns the newest run that is in its copy script, or null.
+TraceReader::Followed* TraceReader::InCopyScript() {
+  const auto run = std::find_if(followed_.rbegin(), followed_.rend(), [](const Followed& each) {
+    return !each.messages.empty() && Matches(each.messages.back().text, kCopyScriptMessage);
+  });
+  return run == followed_.rend() ? nullptr : &*run;
 }
 
 void TraceReader::End() {
-  if (run_) Hold();
-  while (!held_.empty()) ReportFirst();
+  CatchUp();
+  ReportAllBut(0);
+}
+
+// Reports the runs before the oldest unfinished one, and enough others to follow no more than the limit.
+void TraceReader::ReportAllBut(std::size_t limit) {
+  while (!followed_.empty() && (followed_.front().expected.empty() || followed_.size() > limit)) {
+    Followed& first = followed_.front();
+    Run& run = first.run;
+    if (!first.expected.empty()) {
+      ++given_up_;
+      first.Read();  // again, with the lines after its last message
+    }
+    if (first.mixed) {
+      run = Run(run.number, run.file, run.line);
+      run.stopped = "mixed with another run, or lines are missing";
+    }
+    if (run.package == "copy_script_ran" && !run.package_version.empty()) {
+      const std::string installation = run.machine_type + run.copy_command;
+      if (installation == installed_ && run.problem.empty()) {
+        run.problem = run.package_version + " installed again, or a version that begins with it";
+      }
+      installed_ = installation;
+    } else if (run.package == "nothing_newer" && run.mode != "check") {
+      installed_.clear();
+    }
+    report_(run);
+    if (writer_ == &first) writer_ = nullptr;
+    for (Followed& each : followed_) each.rivals.erase(&first);
+    followed_.pop_front();
+  }
 }
 
 }  // namespace ruv_trace

@@ -1,23 +1,21 @@
 // Groups the lines of a trace into runs.
 //
-// The lines do not identify their process, so the lines of concurrent runs are mixed. These facts are certain:
-// - A run that begins while no other is unfinished, and whose lines are all in sequence to the end, is complete.
-// - If a run is unfinished when the next one begins, its lines up to that point are certain.
-// - That next run may end with the lines of the unfinished one, if both reached the same point and one was killed
-//   there. The lines before that point are certain.
-// - As soon as a line is out of sequence, nothing about the run is certain.
-// A later run may also end with the lines of an unfinished one that took longer; its own lines then follow. Therefore
-// runs are held back until enough later runs have ended in sequence.
-#ifndef RUV_TRACE_TRACE_READER_H
-#define RUV_TRACE_TRACE_READER_H
+// The lines do not name their process. Every unfinished run is followed, at most twenty: a message goes to the newest
+// one that it fits.
+// - If it fits an older one as well, it may be that one's. If the older one was killed, nothing is wrong with that. But
+//   if it writes another message later, both are mixed: what each of them did is not known.
+// - A message that fits no run shows that some are missing: all unfinished runs are mixed.
+// - The messages after the application's end are the same in all runs: they mix no runs.
+//
+// What this design gives up: if the newer of two overlapping runs is killed where the older one's next messages fit it,
+// the older one's end is taken for the newer one's. All unattended ways to start the launcher take a lock.
+#pragma once
 
-#include <cstddef>
-#include <deque>
 #include <functional>
-#include <optional>
+#include <list>
+#include <set>
 #include <string>
-#include <string_view>
-#include <utility>
+#include <vector>
 
 #include "run.h"
 
@@ -30,37 +28,42 @@ class TraceReader {
 
   // Goes on with another file. A run may have begun in the one before.
   void BeginFile(const std::string& name);
-  // Takes the next line, without its line feed.
-  void TakeLine(std::string_view line);
-  // Reports the runs that are held back: the trace ends here.
+  // Takes the next line, without its line feed. Returns true if it contains a message of a run.
+  bool Take(const std::string& line);
+  // Reports the runs that are followed: the trace ends here.
   void End();
 
-  // True if the file contains a line of a run.
-  bool FoundRuns() const { return found_runs_; }
-
  private:
-  bool TakeMessage(std::string_view message);
-  void TakeOutOfTurn(std::string_view message);
-  void DoubtAll();
-  void BeginRun();
-  void EndRun();
-  void Hold();
-  void ReportFirst();
+  struct Followed {
+    Run run;
+    std::vector<Message> messages = {};
+    std::vector<std::string> expected = {kFirstMessage};  // next; nothing after the last message
+    bool mixed = false;
+    std::set<Followed*> rivals = {};  // newer runs with messages that may be this one's
+
+    bool Read();
+    bool Fits(const std::string& text) const;
+    void Mix();
+  };
+
+  void Begin();
+  void CatchUp();
+  bool TakeMessage(const std::string& text);
+  bool TakeStray(const std::string& text);
+  void TakeOther(const std::string& text);
+  Followed* InCopyScript();
+  void NoteRivals(Followed& writer, const std::string& text);
+  void ReportAllBut(std::size_t limit);
 
   std::function<void(const Run&)> report_;
   std::string file_;
-  unsigned long line_ = 0;
-  bool found_runs_ = false;
-  unsigned long runs_ = 0;
-  std::optional<Run> run_;         // the last one that began, until it ends
-  std::deque<Run> left_;           // unfinished ones whose lines may be among those of the next
-  unsigned long silent_ends_ = 0;  // runs just before run_ that may have ended without a message
-  std::deque<Run> held_;           // the runs before run_, not reported yet
-  unsigned long unfinished_ = 0;   // runs that may still go on, run_ included
-  std::size_t in_turn_ = 0;        // runs that came to their end since a line was last out of turn
-  std::string installed_;          // the command of the last copy script
+  unsigned long line_ = 0, runs_ = 0;
+  std::list<Followed> followed_;  // the runs since the oldest unfinished one
+  Followed* writer_ = nullptr;    // of the last message
+  bool collects_ = false;         // the last run's messages are read later, all at once
+  bool headless_ = false;         // the messages are those of a run whose beginning is missing
+  unsigned long given_up_ = 0;    // unfinished runs that are no longer followed
+  std::string installed_;         // what the last copy script installed
 };
 
 }  // namespace ruv_trace
-
-#endif  // RUV_TRACE_TRACE_READER_H
