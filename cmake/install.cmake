@@ -31,11 +31,9 @@ endif()
 file(WRITE ${PROJECT_BINARY_DIR}/copyright "${copyright}")
 
 install(TARGETS launcher RUNTIME DESTINATION . COMPONENT programs)
-install(FILES ${PROJECT_BINARY_DIR}/ruv-launcher.8.gz DESTINATION share/man/man8 COMPONENT documents)
-if(TARGET ruv-trace)
-  install(TARGETS ruv-trace RUNTIME DESTINATION bin COMPONENT programs)
-  install(FILES ${PROJECT_BINARY_DIR}/ruv-trace.8.gz DESTINATION share/man/man8 COMPONENT documents)
-endif()
+install(FILES ${PROJECT_BINARY_DIR}/ruv-launcher.8.gz ${PROJECT_BINARY_DIR}/ruv-trace.8.gz DESTINATION share/man/man8
+        COMPONENT documents)
+install(TARGETS ruv-trace RUNTIME DESTINATION bin COMPONENT programs)
 install(FILES docs/administrator.md RENAME README.md DESTINATION ${documents} COMPONENT documents)
 install(FILES docs/security.md ${PROJECT_BINARY_DIR}/copyright DESTINATION ${documents} COMPONENT documents)
 

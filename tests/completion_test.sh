@@ -43,7 +43,7 @@ for option in --update_os --update_arch; do
 done
 
 if [[ -n $ruv_trace ]]; then
-  expected=$("$ruv_trace" --help | grep -oE '^  -[^ ]+( -[^ ]+)?' | tr -d , | tr ' ' '\n' | grep .)
+  expected=$("$ruv_trace" --help | grep -oE '^  -[^ =]+=?( -[^ ]+)?' | tr -d , | tr ' ' '\n' | grep .)
   expect_same "bash, ruv-trace" "$expected" "$(in_bash ruv-trace -)"
   expect_same "zsh, ruv-trace" "$expected" "$(zsh_descriptions ruv-trace | options_in)"
   expect_same "bash, files" "$(ls)" "$(in_bash ruv-trace '')"
