@@ -1,11 +1,6 @@
 // The application's command line, and the question on an unsupported machine.
 #include "installation.h"
 
-using ::testing::ElementsAre;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
-using ::testing::PrintToString;
-
 namespace {
 
 const std::string kWarning =
@@ -44,7 +39,7 @@ TEST(ApplicationLaunch, QuotesTheValuesOfSpecialParameters) {
     machine.Run(row.arguments);
     EXPECT_THAT(machine.Trace(), HasSubstr("TAVMaster::InvokeRUV()\n" + row.traced +
                                            "[TAVRUV]: [Status:]InvokeRUV: command = \"@/ruv\"" + row.command + "\n"));
-    EXPECT_THAT(machine.CallsOf("ruv"), ::testing::SizeIs(1));
+    EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(1));
   }
 }
 

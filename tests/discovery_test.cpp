@@ -2,21 +2,9 @@
 #include <fcntl.h>
 #include <unistd.h>
 
-#include <filesystem>
-
 #include "installation.h"
 #include "launcher/line_reader.h"
 #include "launcher/tav.h"
-
-using ::testing::ElementsAre;
-using ::testing::EndsWith;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
-using ::testing::Not;
-using ::testing::SizeIs;
-using ::testing::StartsWith;
-
-namespace fs = std::filesystem;
 
 namespace {
 

@@ -1,13 +1,10 @@
 // The package tool's exit codes: each step's result, and the message for the user.
-#include <filesystem>
 #include <regex>
 #include <sstream>
 
 #include "installation.h"
 #include "launcher/tav.h"
 #include "packages/exit_code_tables.h"
-
-namespace fs = std::filesystem;
 
 TEST(ExitCodes, GiveResultsAndMessages) {
   std::map<int, std::string> messages;
@@ -60,6 +57,6 @@ TEST(ExitCodes, AToolThatCannotRunFailsSilently) {
   EXPECT_EQ(machine.Run().out, "");
   machine.InstallTool({{"comparelocal", 2}});  // exit code 2 is not signal 2, an interrupt
   EXPECT_EQ(machine.Run().out, "");
-  EXPECT_THAT(machine.TraceLines("[Status:]Return Code from tavtool = "), ::testing::ElementsAre("127", "126", "2"));
-  EXPECT_THAT(machine.CallsOf("ruv"), ::testing::SizeIs(3));
+  EXPECT_THAT(machine.TraceLines("[Status:]Return Code from tavtool = "), ElementsAre("127", "126", "2"));
+  EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(3));
 }

@@ -6,26 +6,13 @@
 
 #include <csignal>
 #include <cstdlib>
-#include <filesystem>
 #include <fstream>
 #include <sstream>
 #include <stdexcept>
 
-namespace fs = std::filesystem;
-
 namespace {
 
 constexpr unsigned kTimeLimit = 20;  // seconds
-
-// The directories that a run of the launcher may make: the second words of the file's entries.
-Strings LauncherDirectories() {
-  std::ifstream file(TMPFILES_CONF);
-  Strings directories;
-  for (std::string type, path, rest; file >> type && std::getline(file >> path, rest);) {
-    if (type == "d") directories.push_back(path);
-  }
-  return directories;
-}
 
 std::string RecordingProgram(const std::string& record, const std::string& then) {
   return "#!/bin/sh\n{ for argument; do printf '[%s]' \"$argument\"; done; echo; } >>'" + record + "'\n" + then + "\n";
@@ -88,7 +75,8 @@ std::string ReadFile(const std::string& path) {
 
 Installation::Installation() {
   if (std::getenv("RUV_SANDBOX") == nullptr) throw std::runtime_error("run the tests through ctest or scripts/sandbox");
-  for (const std::string& path : LauncherDirectories()) fs::remove_all(path);
+  for (const char* path : {kTraceDirectory, "/var/log/TAV_Support", kRepository, kExpansionDirectory})
+    fs::remove_all(path);
   char name[] = "/tmp/ruv-test.XXXXXX";
   directory_ = mkdtemp(name);
   fs::create_directory(directory_ + "/cwd");
@@ -124,6 +112,12 @@ void Installation::InstallCopyScript(const std::string& then) const {
 }
 
 void Installation::CreateRepository() const { fs::create_directory(kRepository); }
+
+void Installation::OfferPackage(int comparison) const {
+  CreateRepository();
+  InstallTool({{"comparelocal", comparison}});
+  InstallCopyScript();
+}
 
 void Installation::MakeUnsupported() const { WriteFile(SupportListFile(), "<MT>9999</MT>\n"); }
 

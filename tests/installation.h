@@ -5,10 +5,22 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <map>
 #include <string>
 #include <vector>
 
+namespace fs = std::filesystem;
+using ::testing::AllOf;
+using ::testing::AnyOf;
+using ::testing::ElementsAre;
+using ::testing::EndsWith;
+using ::testing::HasSubstr;
+using ::testing::IsEmpty;
+using ::testing::Not;
+using ::testing::PrintToString;
+using ::testing::SizeIs;
+using ::testing::StartsWith;
 using Strings = std::vector<std::string>;
 
 inline constexpr const char* kTraceFile = "/var/log/ZEM_Support/ruvtav.log";
@@ -59,6 +71,8 @@ class Installation {
   // Puts a copy script into the expansion directory, where expanding a package would put it.
   void InstallCopyScript(const std::string& then = "exit 0") const;
   void CreateRepository() const;
+  // A package in the repository, which can be installed or, with another exit code of the comparison, cannot.
+  void OfferPackage(int comparison = 21) const;
   // Leaves the machine's type out of the support list.
   void MakeUnsupported() const;
 

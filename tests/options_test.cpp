@@ -3,11 +3,6 @@
 
 #include "installation.h"
 
-using ::testing::ElementsAre;
-using ::testing::EndsWith;
-using ::testing::IsEmpty;
-using ::testing::PrintToString;
-
 TEST(Options, ForwardsWhatIsNotItsOwn) {
   struct Row {
     Strings arguments;

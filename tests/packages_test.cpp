@@ -1,14 +1,6 @@
 // The package steps: their commands, the directories that they make, the version that they pass on.
-#include <filesystem>
 
 #include "installation.h"
-
-using ::testing::ElementsAre;
-using ::testing::EndsWith;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
-
-namespace fs = std::filesystem;
 
 TEST(Packages, OnlineCommandsGetTheForwardedArguments) {
   const Installation machine;

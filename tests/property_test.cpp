@@ -4,7 +4,6 @@
 #include <cctype>
 #include <cstdint>
 #include <cstdlib>
-#include <filesystem>
 #include <random>
 #include <regex>
 #include <set>
@@ -12,14 +11,7 @@
 
 #include "installation.h"
 
-namespace fs = std::filesystem;
 using std::string;
-using ::testing::AllOf;
-using ::testing::AnyOf;
-using ::testing::EndsWith;
-using ::testing::Not;
-using ::testing::PrintToString;
-using ::testing::StartsWith;
 
 namespace {
 
@@ -104,10 +96,8 @@ class Generator {
   }
 
   string InAnyCase(string text) {
-    const bool mixed = OneIn(3);
-    for (char& letter : text) {
-      if (mixed && OneIn(2)) letter = static_cast<char>(std::toupper(static_cast<unsigned char>(letter)));
-    }
+    if (!OneIn(3)) return text;
+    for (char& letter : text) letter = static_cast<char>(OneIn(2) ? std::toupper(letter) : letter);
     return text;
   }
 
@@ -117,20 +107,18 @@ class Generator {
 // The command line, divided as documented.
 struct CommandLine {
   explicit CommandLine(const Strings& arguments) {
-    const std::set<string> flags = {"--chkupd", "--update", "--gui", "--cmd", "--show_stderr"};
-    const std::set<string> identity_options = {"--update_m", "--update_os", "--update_arch"};
     std::set<string> own;
-    for (auto argument = arguments.begin(); argument != arguments.end(); ++argument) {
-      string folded = *argument;
+    for (std::size_t i = 0; i < arguments.size(); ++i) {
+      string folded = arguments[i];
       for (char& c : folded) c = 'A' <= c && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
-      help = help || *argument == "-?" || *argument == "-h";
-      if (identity_options.count(folded) != 0) {
+      help = help || arguments[i] == "-?" || arguments[i] == "-h";
+      if (std::regex_match(folded, std::regex("--update_(m|os|arch)"))) {
         own.insert("identity");
-        if (std::next(argument) != arguments.end()) ++argument;
-      } else if (flags.count(folded) != 0) {
+        ++i;  // its value
+      } else if (std::regex_match(folded, std::regex("--(chkupd|update|gui|cmd|show_stderr)"))) {
         own.insert(folded);
       } else {
-        forwarded += " " + (folded == "--ipmi-lan" || folded == "--vmware-esxi" ? folded : *argument);
+        forwarded += " " + (folded == "--ipmi-lan" || folded == "--vmware-esxi" ? folded : arguments[i]);
       }
     }
     const std::size_t modes = own.count("--chkupd") + own.count("--update");
@@ -151,16 +139,16 @@ void ExpectForwarded(const string& call, const CommandLine& line) {
   EXPECT_THAT(received, AnyOf(line.forwarded, line.forwarded + " 2>/dev/null"));
 }
 
-unsigned long FromEnvironment(const char* variable, unsigned long otherwise) {
+unsigned long FromEnvironment(const char* variable, const char* otherwise) {
   const char* value = std::getenv(variable);
-  return value == nullptr ? otherwise : std::strtoul(value, nullptr, 10);
+  return std::stoul(value == nullptr ? otherwise : value);
 }
 
 }  // namespace
 
 TEST(Property, EveryRunStartsTheApplicationOnceIfItIsDue) {
-  const unsigned long first_seed = FromEnvironment("RUV_PROPERTY_SEED", 1);
-  const unsigned long runs = FromEnvironment("RUV_PROPERTY_RUNS", 200);
+  const unsigned long first_seed = FromEnvironment("RUV_PROPERTY_SEED", "1");
+  const unsigned long runs = FromEnvironment("RUV_PROPERTY_RUNS", "200");
   for (unsigned long seed = first_seed; seed < first_seed + runs && !HasFailure(); ++seed) {
     Generator generator(seed);
     const Installation machine;

@@ -1,15 +1,6 @@
 // Whole runs: which steps follow which, and how a run reacts to signals, limits and closed streams.
-#include <filesystem>
 
 #include "installation.h"
-
-using ::testing::ElementsAre;
-using ::testing::EndsWith;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
-using ::testing::SizeIs;
-
-namespace fs = std::filesystem;
 
 // The whole trace of one run.
 TEST(RunSequence, InstallsAPackageFromTheRepositoryAndStartsTheApplication) {
@@ -108,7 +99,7 @@ TEST(RunSequence, UpdateModeStopsAtAFailedStepAndNeverStartsTheApplication) {
       {"--update", {{"comparelocal", 21}, {"expand", 1}}, invalid, all, ""},
   };
   for (const Row& row : rows) {
-    SCOPED_TRACE(row.option + " " + ::testing::PrintToString(row.tool));
+    SCOPED_TRACE(row.option + " " + PrintToString(row.tool));
     const Installation machine;
     machine.InstallTool(row.tool);
     machine.InstallCopyScript();
@@ -210,8 +201,7 @@ TEST(RunSequence, GoesOnWhateverItsParentLeftToIt) {
   for (const RunOptions& row : rows) {
     SCOPED_TRACE(row.prelude);
     const Installation machine;
-    machine.CreateRepository();
-    machine.InstallTool({{"comparelocal", 30}});
+    machine.OfferPackage(30);
     EXPECT_EQ(machine.Run({"-x"}, row).status, 0);
     EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre("[-x]"));
     EXPECT_THAT(machine.TraceLines("You already"), SizeIs(1)) << "no exit code, or console text in the trace";

@@ -1,13 +1,6 @@
 // The list of supported machine types: what counts as an entry, and what an installation appends.
-#include <filesystem>
 
 #include "installation.h"
-
-using ::testing::EndsWith;
-using ::testing::HasSubstr;
-using ::testing::StartsWith;
-
-namespace fs = std::filesystem;
 
 TEST(SupportList, ReadsColumns5To8OfALineWithATag) {
   struct Row {
@@ -46,9 +39,7 @@ TEST(SupportList, WarnsAboutAMissingListAndSupportsNothing) {
 
 TEST(SupportList, GetsAnEntryFromEveryInstallation) {
   const Installation machine;
-  machine.CreateRepository();
-  machine.InstallTool({{"comparelocal", 21}});
-  machine.InstallCopyScript();
+  machine.OfferPackage();
   for (const std::string before : {"", "<MT>1234</MT>"}) {
     WriteFile(machine.SupportListFile(), before);
     for (int run = 0; run < 2; ++run) EXPECT_THAT(machine.Run().out, EndsWith("please wait...Done\n"));
@@ -58,9 +49,7 @@ TEST(SupportList, GetsAnEntryFromEveryInstallation) {
 
 TEST(SupportList, IsNotCreatedIfItsDirectoryIsMissing) {
   const Installation machine;
-  machine.CreateRepository();
-  machine.InstallTool({{"comparelocal", 21}});
-  machine.InstallCopyScript();
+  machine.OfferPackage();
   fs::remove_all(machine.Directory() + "/data");
   // No question: for this run the machine counts as supported.
   EXPECT_THAT(machine.Run().out,

@@ -1,12 +1,7 @@
 // The trace file: its lines, and runs in which it cannot be written.
-#include <filesystem>
 
 #include "installation.h"
 #include "launcher/tav.h"
-
-using ::testing::ElementsAre;
-
-namespace fs = std::filesystem;
 
 TEST(TraceLog, CutsAMessageAfter511Bytes) {
   const Installation machine;
