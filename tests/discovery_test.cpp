@@ -111,7 +111,7 @@ TEST(Discovery, IgnoresALineThatAReadErrorCutsShort) {
   EXPECT_FALSE(file.Next(line));
 }
 
-// 100 MB without a line feed, in each of the files that the launcher reads.
+// 60 MB without a line feed, in each of the files that the launcher reads.
 TEST(Discovery, EndsWithOneLineIfALineDoesNotFitIntoMemory) {
   if (IsInstrumented()) GTEST_SKIP() << "needs more memory than the launcher";
   for (const std::string& file :
@@ -121,10 +121,10 @@ TEST(Discovery, EndsWithOneLineIfALineDoesNotFitIntoMemory) {
     machine.CreateRepository();
     machine.InstallCopyScript();
     const std::string path = file[0] == '/' ? file : machine.Directory() + "/" + file;
-    const std::string lengthen = "truncate -s 100M '" + path + "'";
+    const std::string lengthen = "truncate -s 60M '" + path + "'";
     machine.Install("guihelper.sh", lengthen);
     machine.Install("tavtool", lengthen + "; exit 21");
-    const RunResult run = machine.Run({"-v"}, With("prlimit --as=60000000"));
+    const RunResult run = machine.Run({"-v"}, With("prlimit --as=40000000"));
     EXPECT_EQ(run.status, 1);
     EXPECT_EQ(run.out, "ERROR: Not enough memory, RUV launcher ends.\n");
     EXPECT_THAT(machine.CallsOf("copy.sh"), IsEmpty());
