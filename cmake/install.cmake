@@ -37,8 +37,8 @@ install(TARGETS ruv-trace RUNTIME DESTINATION bin COMPONENT programs)
 install(FILES docs/administrator.md RENAME README.md DESTINATION ${documents} COMPONENT documents)
 install(FILES docs/security.md ${PROJECT_BINARY_DIR}/copyright DESTINATION ${documents} COMPONENT documents)
 
-# Installs a file in the packages only: component system (/usr), generic or debian (the same, in one of them) or settings
-# (/). More arguments can set its permissions.
+# Installs a file in the packages only. The component says where: system (/usr, in both), generic (/usr, in the .rpm),
+# debian (/usr, in the .deb) or settings (/, in both). Further arguments can set its permissions.
 function(ruv_package component file path)
   get_filename_component(directory ${path} DIRECTORY)
   get_filename_component(name ${path} NAME)

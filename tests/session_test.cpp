@@ -2,7 +2,7 @@
 #include "installation.h"
 #include "launcher/tav.h"
 
-TEST(Session, FileExistAndDirExistFollowLinks) {
+TEST(Session, FileExistAndDirExistsFollowLinks) {
   const Installation machine;
   const NZEMRUVTAV::TAVMaster session;
   const std::string base = machine.Directory() + "/kinds/";

@@ -91,7 +91,7 @@ class TAVMaster {
   // Ends the process after the usage text (status 0) and after a rejected combination of options (one line on the
   // console, status 1).
   void ParseParameters(int argc, char** argv);
-  // Prints the help text of the shared command line.
+  // Prints the help text, which includes the application's options.
   void PrintUsage() const;
 
   // ---- Support list -------------------------------------------------------------------------------------------------
