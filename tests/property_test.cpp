@@ -38,7 +38,7 @@ const Strings kAnswers = Split("y\n|N\n|yes\n|\n| y\n|Y|n");
 // "kill -INT 0" signals the whole process group, like Ctrl-C.
 const Strings kEnds = Split("exit 0|exit 0|exit 1|exit 255|kill -INT 0|kill -INT $$|kill -KILL $$");
 const Strings kToolEnds = Split(
-    "exit 0|exit 0|exit 0|exit 0|exit 21|exit 21|exit 21|exit 32|exit 52|exit 61|exit 1|exit 2|exit 30|exit 51|exit 60|"
+    "exit 0|exit 21|exit 32|exit 52|exit 61|exit 1|exit 2|exit 30|exit 51|exit 60|"
     "exit 77|exit 126|exit 255|kill -INT 0|kill -INT $$|kill -TERM $$");
 
 class Generator {
@@ -64,8 +64,9 @@ class Generator {
     machine.Install("guihelper.sh", Pick(kEnds));
     machine.InstallCopyScript("echo copied; " + Pick(kEnds));
     string tool = "cat \"$0.output\"\ncase $1 in\n";
-    for (const char* verb : {"comparelocal", "compareweb", "acquire", "copy", "expand"}) {
-      tool += string(verb) + ") " + Pick(kToolEnds) + " ;;\n";
+    for (const string verb : {"comparelocal", "compareweb", "acquire", "copy", "expand"}) {
+      const string usual = verb == "comparelocal" ? "exit 21" : "exit 0";
+      tool += verb + ") " + (OneIn(3) ? Pick(kToolEnds) : usual) + " ;;\n";
     }
     machine.Install("tavtool", tool + "esac");
     machine.Install("ruv", Pick(kEnds));
@@ -78,7 +79,7 @@ class Generator {
     for (string path : {"guihelper.sh", "tavtool", "ruv", "data/supportlist.xml", "data", kSystemInformationFile,
                         kRepository, kExpansionDirectory}) {
       if (path[0] != '/') path = machine.Directory() + "/" + path;
-      if (!OneIn(12)) continue;
+      if (!OneIn(20)) continue;
       fs::remove_all(path);
       if (OneIn(3)) fs::create_directory(path);
       if (OneIn(3)) WriteFile(path, "");
