@@ -1,4 +1,4 @@
-// The meaning of the package tool's exit codes: the tables used by the launcher and by ruv-trace.
+// The meaning of the package tool's exit codes, for the launcher and for ruv-trace.
 #pragma once
 
 namespace NZEMRUVTAV {
@@ -41,5 +41,21 @@ inline constexpr ErrMsg ErrMsgs[] = {
      "Internal Error.\nPlease check your network environment and try again.\n"
      "If you need to access internet through proxy, please use --proxy and try again."},
 };
+
+// Returns the result of a package step.
+inline int ResultOf(int exit_code) {
+  for (const ToolResult& known : kToolResults) {
+    if (known.exit_code == exit_code) return known.result;
+  }
+  return kFailure;
+}
+
+// Returns the message of a known error, or "".
+inline const char* MessageOf(int exit_code) {
+  for (const ErrMsg& known : ErrMsgs) {
+    if (known.exit_code == exit_code) return known.message;
+  }
+  return "";
+}
 
 }  // namespace NZEMRUVTAV

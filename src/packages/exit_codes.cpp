@@ -21,17 +21,12 @@ int TAVMaster::HandleTAVToolReturnValue(int status) const {
   // Not WEXITSTATUS: -1, a failure of system() itself, must stay -1.
   const int exit_code = status >> 8;
   DebugLog("[Status:]Return Code from tavtool = %d", exit_code);
-  for (const ToolResult& known : kToolResults) {
-    if (known.exit_code == exit_code) return known.result;
+  const char* message = MessageOf(exit_code);
+  if (*message != '\0') {
+    PrintLine(message);
+    DebugLog("%s", message);
   }
-  for (const ErrMsg& known : ErrMsgs) {
-    if (known.exit_code == exit_code) {
-      PrintLine(known.message);
-      DebugLog("%s", known.message);
-      break;
-    }
-  }
-  return kFailure;
+  return ResultOf(exit_code);
 }
 
 }  // namespace NZEMRUVTAV

@@ -1,5 +1,6 @@
 // ruv-trace: summarises the trace of the launcher.
 #include <getopt.h>
+#include <glob.h>
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -7,19 +8,15 @@
 #include <charconv>
 #include <cstring>
 #include <ctime>
-#include <filesystem>
 #include <map>
 #include <memory>
-#include <regex>
 
 #include "log/trace_format.h"
-#include "report.h"
 #include "trace_reader.h"
 
 namespace {
 
 using namespace ruv_trace;
-namespace fs = std::filesystem;
 
 constexpr const char* kHelp =
     R"(Usage: ruv-trace [OPTION]... [FILE]...
@@ -49,10 +46,6 @@ struct {
 
 void Complain(const std::string& message) { std::fprintf(stderr, "ruv-trace: %s\n", Printable(message).c_str()); }
 
-std::string Counted(long count, const std::string& what) {
-  return std::to_string(count) + " " + what + (count == 1 ? "" : "s");
-}
-
 // Returns false, with a message, if the output could not be written.
 bool Written() {
   if (std::fflush(stdout) == 0 && std::ferror(stdout) == 0) return true;
@@ -62,37 +55,14 @@ bool Written() {
 
 void Print(const Run& run) {
   static bool header_printed = false;
-  if (options.json != 0) {
-    std::fputs(JsonLine(run, options.show_passwords != 0).c_str(), stdout);
-  } else if (options.check != 0) {
-    std::fputs(CheckLine(run).c_str(), stdout);
-  } else {
-    if (!header_printed) std::fputs(TableHeader().c_str(), stdout);
+  std::string text = options.json != 0 ? JsonLine(run, options.show_passwords != 0) : CheckLine(run);
+  if (options.json == 0 && options.check == 0) {
+    text = (header_printed ? "" : kTableHeader) + TableLine(run);
+    if (options.with_details != 0) text += Details(run, options.show_passwords != 0);
     header_printed = true;
-    std::fputs(TableLine(run).c_str(), stdout);
-    if (options.with_details != 0) std::fputs(Details(run, options.show_passwords != 0).c_str(), stdout);
   }
+  std::fputs(text.c_str(), stdout);
 }
-
-// What is kept of all runs.
-struct Summary {
-  std::map<std::string, long> count;  // of each verdict
-  Run last, last_look;                // that launched or updated, or may have; and that only looked for an update since
-
-  void Take(const Run& run) {
-    ++count[run.Verdict()];
-    if (run.Verdict() == "none") return;
-    last_look = run.mode == "check" ? run : Run();
-    if (run.mode != "check") last = run;
-  }
-
-  // Returns the run that --check judges: the last one that launched or updated or, if there is none or it is ok and the
-  // later look for an update is not, that look.
-  const Run& Judged() const {
-    const bool look_counts = last.number == 0 || (last.Verdict() == "ok" && last_look.Verdict() != "ok");
-    return look_counts && last_look.number != 0 ? last_look : last;
-  }
-};
 
 // Reads a file of any size and content, in constant memory; "-" is standard input. What follows the last line feed is
 // not a line. Sets written to the file's time if that is later and the file contains runs. Returns why the file is
@@ -131,42 +101,47 @@ std::string ReadFile(const std::string& name, TraceReader& reader, std::time_t& 
 }
 
 // Returns the launcher's trace and, before it, the file that the last rotation renamed and has not compressed, if there
-// is one: ruvtav.log.1 or, with logrotate's dateext, ruvtav.log-20260301.
+// is one: ruvtav.log.1 or, with logrotate's dateext, ruvtav.log-20260301. Then there may be no new file yet.
 std::vector<std::string> DefaultFiles() {
-  const fs::path trace = fs::path(NZEMRUVTAV::kLogDirectory) / NZEMRUVTAV::kLogFile;
-  const std::regex rotated(NZEMRUVTAV::kLogFile + std::string("(\\.1|-[0-9-]+)"));
-  std::error_code ignored;
-  std::pair<fs::file_time_type, std::string> newest = {fs::file_time_type::min(), ""};
-  for (const fs::directory_entry& entry : fs::directory_iterator(trace.parent_path(), ignored)) {
-    if (!std::regex_match(entry.path().filename().string(), rotated)) continue;
-    newest = std::max(newest, {entry.last_write_time(ignored), entry.path()});
+  const std::string trace = std::string(NZEMRUVTAV::kLogDirectory) + "/" + NZEMRUVTAV::kLogFile;
+  glob_t found = {};
+  glob((trace + "{.1,-[0-9]*}").c_str(), GLOB_BRACE, nullptr, &found);
+  std::pair<std::time_t, std::string> newest;
+  struct stat status = {};
+  for (std::size_t i = 0; i < found.gl_pathc; ++i) {
+    const std::string name = found.gl_pathv[i];
+    const bool compressed = name.find('.', trace.size() + 1) != std::string::npos;
+    if (!compressed && stat(name.c_str(), &status) == 0) newest = std::max(newest, {status.st_mtime, name});
   }
+  globfree(&found);
   if (newest.second.empty()) return {trace};
-  // After a rotation there is no new file until the next run.
-  return fs::exists(trace, ignored) ? std::vector<std::string>{newest.second, trace} : std::vector{newest.second};
+  if (stat(trace.c_str(), &status) != 0) return {newest.second};
+  return {newest.second, trace};
 }
 
-// Prints the one line of --check, and returns the status. The complaint is about the first file that was refused.
-int Check(const Run& last, const std::string& complaint, std::time_t written) {
-  Run judged;
-  judged.stopped = complaint.empty() ? "no run that launched or updated" : complaint;
-  if (complaint.empty() && last.number != 0) judged = last;
+// Prints the one line of --check: about the run or, if there is none, why. Returns the status.
+int Check(Run run, const std::string& reason, std::time_t written) {
+  if (!reason.empty()) run.stopped = reason;
   const long days = static_cast<long>((std::time(nullptr) - written) / 86400);
-  if (complaint.empty() && options.max_age >= 0 && days > options.max_age && judged.problem.empty()) {
-    judged = {};
-    judged.problem = "no run for " + Counted(days, "day");
+  if (reason.empty() && options.max_age >= 0 && days > options.max_age && run.problem.empty()) {
+    run = Run();
+    run.problem = "no run for " + std::to_string(days) + (days == 1 ? " day" : " days");
   }
-  Print(judged);
+  Print(run);
   if (!Written()) return kUnknown;
-  return judged.Verdict() == "ok" ? kOk : judged.Verdict() == "problem" ? kProblem : kUnknown;
+  return run.Verdict() == "ok" ? kOk : run.Verdict() == "problem" ? kProblem : kUnknown;
 }
 
 int Summarise(const std::vector<std::string>& names) {
-  Summary summary;
+  std::map<std::string, long> count;  // of each verdict
+  Run last, last_look;  // that launched or updated, or may have; and that only looked for an update, since then
   TraceReader reader([&](const Run& run) {
-    summary.Take(run);
-    const bool is_fine = run.Verdict() == "ok" || run.Verdict() == "none";
-    if (options.check == 0 && (options.problems_only == 0 || !is_fine)) Print(run);
+    const std::string verdict = run.Verdict();
+    ++count[verdict];
+    if (options.check == 0 && (options.problems_only == 0 || (verdict != "ok" && verdict != "none"))) Print(run);
+    if (verdict == "none") return;
+    last_look = run.mode == "check" ? run : Run();
+    if (run.mode != "check") last = run;
   });
   std::vector<std::string> complaints;
   std::time_t written = 0;
@@ -175,15 +150,19 @@ int Summarise(const std::vector<std::string>& names) {
     if (!complaint.empty()) complaints.push_back(complaint);
   }
   reader.End();
-  if (complaints.empty() && written == 0) complaints.push_back("no run of the launcher in " + names.back());
-  if (options.check != 0) return Check(summary.Judged(), complaints.empty() ? "" : complaints.front(), written);
-  std::string total;
-  long runs = 0;
-  for (const char* verdict : {"ok", "problem", "unknown", "none"}) {
-    runs += summary.count[verdict];
-    total += (total.empty() ? ": " : ", ") + std::to_string(summary.count[verdict]) + " " + verdict;
+  if (complaints.empty() && count.empty()) complaints.push_back("no run of the launcher in " + names.back());
+  if (options.check != 0) {
+    if (!complaints.empty()) return Check(Run(), complaints.front(), written);
+    const bool look_counts = last.number == 0 || (last.Verdict() == "ok" && last_look.Verdict() != "ok");
+    const Run& judged = look_counts && last_look.number != 0 ? last_look : last;
+    return Check(judged, judged.number == 0 ? "no run that launched or updated" : "", written);
   }
-  if (options.json == 0 && runs > 0) std::puts((Counted(runs, "run") + total).c_str());
+  const long ok = count["ok"], problem = count["problem"], unknown = count["unknown"], none = count["none"];
+  const long runs = ok + problem + unknown + none;
+  if (options.json == 0 && runs > 0) {
+    std::printf("%ld run%s: %ld ok, %ld problem, %ld unknown, %ld none\n", runs, runs == 1 ? "" : "s", ok, problem,
+                unknown, none);
+  }
   for (const std::string& complaint : complaints) Complain(complaint);
   return Written() && complaints.empty() ? EXIT_SUCCESS : EXIT_FAILURE;
 }
@@ -191,34 +170,22 @@ int Summarise(const std::vector<std::string>& names) {
 }  // namespace
 
 int main(int argc, char** argv) {
-  const option long_options[] = {{"json", no_argument, &options.json, 1},
-                                 {"long", no_argument, &options.with_details, 1},
-                                 {"problems", no_argument, &options.problems_only, 1},
-                                 {"check", no_argument, &options.check, 1},
-                                 {"show-passwords", no_argument, &options.show_passwords, 1},
-                                 {"max-age", required_argument, nullptr, 'a'},
-                                 {"help", no_argument, nullptr, 'h'},
-                                 {"version", no_argument, nullptr, 'V'},
-                                 {}};
+  // clang-format off
+  const option long_options[] = {
+      {"json", 0, &options.json, 1}, {"long", 0, &options.with_details, 1}, {"problems", 0, &options.problems_only, 1},
+      {"check", 0, &options.check, 1}, {"max-age", 1, nullptr, 'a'},
+      {"show-passwords", 0, &options.show_passwords, 1}, {"help", 0, nullptr, 'h'}, {"version", 0, nullptr, 'V'}, {}};
+  // clang-format on
   for (int letter = 0; (letter = getopt_long(argc, argv, "h", long_options, nullptr)) != -1;) {
-    switch (letter) {
-      case 0:
-        break;
-      case 'h':
-        std::fputs(kHelp, stdout);
-        return Written() ? EXIT_SUCCESS : EXIT_FAILURE;
-      case 'V':
-        std::puts("ruv-trace " RUV_VERSION);
-        return Written() ? EXIT_SUCCESS : EXIT_FAILURE;
-      case 'a':
-        if (*std::from_chars(optarg, optarg + std::strlen(optarg), options.max_age).ptr == '\0' && options.max_age >= 0)
-          break;
-        Complain(std::string("not a number of days: ") + optarg);
-        [[fallthrough]];
-      default:
-        std::fputs("Try ruv-trace --help.\n", stderr);
-        return kUsageError;
+    if (letter == 'h' || letter == 'V') {
+      std::fputs(letter == 'h' ? kHelp : "ruv-trace " RUV_VERSION "\n", stdout);
+      return Written() ? EXIT_SUCCESS : EXIT_FAILURE;
     }
+    const char* end = letter == 'a' ? optarg + std::strlen(optarg) : nullptr;
+    const bool is_days = end != nullptr && std::from_chars(optarg, end, options.max_age).ptr == end;
+    if (letter == 0 || (is_days && options.max_age >= 0)) continue;
+    std::fputs("Try ruv-trace --help.\n", stderr);
+    return kUsageError;
   }
   const std::vector<std::string> names(argv + optind, argv + argc);
   return Summarise(names.empty() ? DefaultFiles() : names);

@@ -15,10 +15,12 @@ using namespace NZEMRUVTAV;
 
 constexpr const char* kBetweenSteps = "unfinished: between two steps";
 
-class Parser {
- public:
-  Parser(const std::vector<Message>& messages, Run& run, std::vector<std::string>& expected)
-      : next_(messages.data()), end_(next_ + messages.size()), run_(run), expected_(expected) {}
+struct Parser {
+  const std::string *next_, *end_;
+  Run& run_;
+  std::vector<std::string>& expected_;
+
+  struct Stopped {};  // the message that the launcher writes next is not there
 
   // Reads the run up to its end or to where it stopped.
   bool Read() {
@@ -38,18 +40,13 @@ class Parser {
     return next_ == end_;
   }
 
- private:
-  struct Stopped {};  // the message that the launcher writes next is not there
-
   // Takes the next message if it is this one, and returns its value. Until the next one the run is between two steps.
   std::optional<std::string> Take(const std::string& text) {
-    if (next_ == end_) {
-      expected_.push_back(text);
-      return {};
-    }
-    if (!Matches(next_->text, text)) return {};
+    if (next_ == end_) expected_.push_back(text);
+    if (next_ == end_ || !Matches(*next_, text)) return {};
     run_.stopped = kBetweenSteps;
-    return next_++->text.substr(text.size());
+    const std::string value = next_++->substr(text.size());
+    return value.substr(0, value.find('\n'));
   }
 
   // The same, but the run stops if the message is not there. Until the next one the run is in this state.
@@ -63,8 +60,8 @@ class Parser {
   // Takes a command that ends with this redirection: an argument may contain line feeds. If it has none (because of
   // --show_stderr, or the launcher cut the message), the lines after the first may be other output.
   Command ExpectCommand(const std::string& text, const char* state, const std::string& redirection) {
-    std::string command = Expect(text, state);
-    command += next_[-1].more;
+    Expect(text, state);
+    const std::string command = next_[-1].substr(text.size());
     const std::size_t longest = kMessageBufferSize - 1 - text.size();
     const std::size_t last = (command + "\n").find(redirection + "\n");
     if (last < longest - redirection.size()) return {command.substr(0, last + redirection.size())};
@@ -86,6 +83,7 @@ class Parser {
     if (run_.problem.empty()) run_.problem = problem;
   }
 
+  // The steps, in the launcher's order.
   void TAVMaster() {
     Expect(kFirstMessage);
     Enter("GetTAVBinaryPath", "the launcher's directory was not found, or unfinished");
@@ -102,24 +100,17 @@ class Parser {
     Expect("[Status:]TAV Uncompressed Path = ");
     Exit("TAVMaster");
   }
-
   bool isPortableRUV() {
     if (Take("[Status:]This is not portable version of RUV")) return false;
     Expect("[Status:]This is a portable RUV,portablePath = ");
     return true;
   }
-
   void TAVMasterMain() {
     Enter("TAVMasterMain");
     ParseParameters();
-    if (TakeEntry("CheckUpdate")) {
-      RunUpdateMode();
-    } else {
-      RunLaunchMode();
-    }
+    TakeEntry("CheckUpdate") ? RunUpdateMode() : RunLaunchMode();
     Exit("TAVMasterMain");
   }
-
   void RunUpdateMode() {
     run_.mode = "check";
     CheckUpdate();
@@ -130,7 +121,6 @@ class Parser {
     Enter("CompareTAVPackage");
     CompareTAVPackage();
   }
-
   void RunLaunchMode() {
     const bool ignores_packages = TakeEntry("InvokeRUV");
     const bool is_portable = !ignores_packages && isPortableRUV();
@@ -143,13 +133,11 @@ class Parser {
     // An installation makes the machine a supported one.
     InvokeRUV(!ignores_packages && run_.copy_command.empty());
   }
-
   void ParseParameters() {
     Enter("ParseParameters", kHelpShown);
     while (Take("[Status:]Warning: Unknown Parameter \"")) run_.stopped = kHelpShown;
     Exit("ParseParameters", kOptionsRejected);
   }
-
   // Every command of the package tool is followed by its exit code and, for some codes, their message.
   void HandleTAVToolReturnValue(const std::string& command, const std::string& verb) {
     run_.calls.push_back({verb, ExpectCommand(command, "unfinished: in tavtool", " 2>&1")});
@@ -157,51 +145,43 @@ class Parser {
     const std::string digits = Expect("[Status:]Return Code from tavtool = ");
     int code = 0;
     if (*std::from_chars(digits.c_str(), digits.c_str() + digits.size(), code).ptr != '\0') throw Stopped();
-    run_.calls.back().exit_code = code;
-    const ToolOutcome outcome = OutcomeOf(verb, code);
-    if (outcome.failed) Fail(verb + " " + std::to_string(code) + ": " + outcome.meaning);
-    if (!outcome.package.empty()) run_.package = outcome.package;
+    ToolCall& call = run_.calls.back();
+    const std::string package = TakeExitCode(call, code);
+    if (!package.empty()) run_.package = package;
+    if (call.result == "problem") Fail(verb + " " + digits + ": " + call.meaning);
     if (const std::string text = ErrorText(code); !text.empty()) Expect(text);
   }
-
   // PROGRAM VERB -l "PATH" [-s|-t "PATH"] -m TYPE -o SYSTEM -a ARCHITECTURE ...
   void ReadIdentity(const std::string& command) {
-    const std::size_t type = command.find("\" -m ");
-    const std::size_t system = command.find(" -o ", type);
-    const std::size_t architecture = command.find(" -a ", system);
-    const std::size_t end = command.find(' ', architecture + 4);
+    const std::size_t type = command.find("\" -m "), system = command.find(" -o ", type);
+    const std::size_t architecture = command.find(" -a ", system), end = command.find(' ', architecture + 4);
     if (architecture == std::string::npos || end == std::string::npos) return;
     run_.machine_type = command.substr(type + 5, system - type - 5);
     run_.system = command.substr(system + 4, architecture - system - 4);
     run_.architecture = command.substr(architecture + 4, end - architecture - 4);
   }
-
   void CheckUpdate() {
     HandleTAVToolReturnValue("[Status:]CheckUpdate:TAVToolCmd = ", TAVTOOL_CMD_COMPWEB);
     Exit("CheckUpdate");
   }
-
   void AcquireUpdate() {
     isPortableRUV();
     Take("[Status:]AcquireUpdate: command = ");
     HandleTAVToolReturnValue("[Status:]AcquireUpdate: TAVToolCmd = ", TAVTOOL_CMD_ACQUIRE);
     Exit("AcquireUpdate");
   }
-
   // Reads also the installation that follows if there is a package to install.
   void CompareTAVPackage() {
     HandleTAVToolReturnValue("[Status:]CompareTAVPackage: TAVToolCmd = ", TAVTOOL_CMD_COMPLOC);
     Exit("CompareTAVPackage");
     if (run_.package == "available") DecompressTAV();
   }
-
   void DecompressTAV() {
     Enter("DecompressTAV");
     HandleTAVToolReturnValue("[Status:]DecompressTAV: TAVToolCmd = ", TAVTOOL_CMD_EXPAND);
     if (run_.package == "expanded") CopyTAVToRUVFoler();
     Exit("DecompressTAV");
   }
-
   void CopyTAVToRUVFoler() {
     Enter("CopyTAVToRUVFoler");
     if (Take("[Status:]CopyTAVToRUVFoler: script file \"")) {
@@ -215,7 +195,7 @@ class Parser {
     // The shell's own complaint, "sh: ...SCRIPT: REASON", shows that it could not run the script.
     static const std::regex kComplaint("\nsh: .*?/" + COPYSCRIPT + ": (.*)");
     std::smatch match;
-    const bool ran = !std::regex_search(next_[-1].more, match, kComplaint);
+    const bool ran = !std::regex_search(next_[-1], match, kComplaint);
     Exit("CopyTAVToRUVFoler");
     run_.package = ran ? "copy_script_ran" : "copy_script_not_run";
     if (!ran) Fail("copy script not run: " + match.str(1));
@@ -224,7 +204,6 @@ class Parser {
     if (std::regex_search(run_.copy_command, match, kVersion)) run_.package_version = match.str(1);
     Expect("[Status:]DecompressTAV: Copy TAV to RUV Folder Successfully!");
   }
-
   void CopyPortableTAVToRepository() {
     Enter("CopyPortableTAVToRepository");
     if (!Take("[Status:]CopyPortableTAVToRepository: The directory <Portable>/update does not Exist!")) {
@@ -233,7 +212,6 @@ class Parser {
     }
     Exit("CopyPortableTAVToRepository");
   }
-
   void InvokeRUV(bool may_ask) {
     while (Take("[Debug:] Processing special parameters [")) {
       const auto option = Take("[Error:]InvokeRUV: required parameters are missing for option = ");
@@ -244,32 +222,24 @@ class Parser {
     run_.command = ExpectCommand("[Status:]InvokeRUV: command = ", "unfinished: in ruv or at the question before it",
                                  " 2>/dev/null");
     Exit("InvokeRUV");
-    run_.ruv = may_ask && !SuppressesQuestion() ? "started_or_declined" : "started";
-  }
-
-  // True if -b, -i or -r is in the application's command, outside quotes. In an argument of several words they look the
-  // same.
-  bool SuppressesQuestion() const {
+    // -b, -i and -r suppress the question, outside quotes. In an argument of several words they look the same.
     static const std::regex kQuoted(R"("[^"]*"?)"), kOption(" -[bir] ");
     const std::string command = run_.command.text + (run_.command.cut ? "" : " ");
-    return std::regex_search(std::regex_replace(command, kQuoted, ""), kOption);
+    if (may_ask) may_ask = !std::regex_search(std::regex_replace(command, kQuoted, ""), kOption);
+    run_.ruv = may_ask ? "started_or_declined" : "started";
   }
-
-  const Message* next_;
-  const Message* const end_;
-  Run& run_;
-  std::vector<std::string>& expected_;
 };
 
 }  // namespace
 
 bool Matches(std::string_view message, std::string_view expected) {
   if (message.substr(0, expected.size()) != expected) return false;
-  return message.size() == expected.size() || std::string_view(" [\"").find(expected.back()) != std::string_view::npos;
+  return message.size() == expected.size() || message[expected.size()] == '\n' ||
+         std::string_view(" [\"").find(expected.back()) != std::string_view::npos;
 }
 
-bool Read(const std::vector<Message>& messages, Run& run, std::vector<std::string>& expected) {
-  return Parser(messages, run, expected).Read();
+bool Read(const std::vector<std::string>& messages, Run& run, std::vector<std::string>& expected) {
+  return Parser{messages.data(), messages.data() + messages.size(), run, expected}.Read();
 }
 
 }  // namespace ruv_trace

@@ -1,8 +1,8 @@
-#include "report.h"
-
 #include <algorithm>
 #include <nlohmann/json.hpp>
 #include <regex>
+
+#include "run.h"
 
 namespace ruv_trace {
 namespace {
@@ -21,17 +21,17 @@ std::string JsonText(const Json& json) {
 // Hides everything after the first option whose value contains a password, up to the redirections: the trace does not
 // show where the value ends. The user's options begin at the given position.
 std::string Shown(const std::string& text, bool show_passwords, std::size_t begin = 0) {
-  static const std::regex kPassword(R"(((?:|[\s\S]*?[\s"'])(?:-t|--ipmi-lan|--vmware-esxi|--remote-zfld|--proxy-password|)"
-                                    R"(--proxy-user(?=[\s\S]*:)|--proxy-address(?=[\s\S]*@)))(?![a-z0-9])[\s\S]*?)"
-                                    R"(((?: 2>/dev/null| 1>/dev/null| 1>tav\.log| 2>&1)*))",
-                                    std::regex::icase);
+  static const std::regex kPassword(
+      R"(((?:|[\s\S]*?[\s"'])(?:-t|--ipmi-lan|--vmware-esxi|--remote-zfld|--proxy-password|--proxy-user(?=[\s\S]*:)|)"
+      R"(--proxy-address(?=[\s\S]*@)))(?![a-z0-9])[\s\S]*?((?: 2>/dev/null| 1>/dev/null| 1>tav\.log| 2>&1)*))",
+      std::regex::icase);
   std::smatch parts;
-  if (show_passwords || begin >= text.size()) return text;
-  const std::string options = text.substr(begin);
-  if (!std::regex_match(options, parts, kPassword)) return text;
+  const std::string options = text.substr(std::min(begin, text.size()));
+  if (show_passwords || !std::regex_match(options, parts, kPassword)) return text;
   return text.substr(0, begin) + parts.str(1) + " ***" + parts.str(2);
 }
 
+// "-t" is also an option of the package tool, before "-m".
 std::string Shown(const ToolCall& call, bool show_passwords) {
   return Shown(call.command.text, show_passwords, call.command.text.find("\" -m "));
 }
@@ -62,8 +62,6 @@ Json OrNull(const std::string& text) { return text.empty() ? Json() : Json(text)
 
 }  // namespace
 
-std::string TableHeader() { return "RUN VERDICT MACHINE DID    PACKAGE AND RUV, OR WHAT IS WRONG\n"; }
-
 std::string TableLine(const Run& run) {
   const std::string number = std::to_string(run.number);
   const std::string columns = std::string(number.size() < 3 ? 3 - number.size() : 0, ' ') + number + " " +
@@ -79,9 +77,7 @@ std::string Details(const Run& run, bool show_passwords) {
       OrUnknown(run.system) + "/" + OrUnknown(run.architecture));
   if (!run.Reason().empty()) add("reason: " + run.Reason());
   for (const ToolCall& call : run.calls) {
-    add(call.verb + (call.exit_code
-                         ? " " + std::to_string(*call.exit_code) + ": " + OutcomeOf(call.verb, *call.exit_code).meaning
-                         : ": no exit code"));
+    add(call.verb + (call.exit_code ? " " + std::to_string(*call.exit_code) : "") + ": " + call.meaning);
     add("  " + Shown(call, show_passwords) + (call.command.cut ? "..." : ""));
   }
   if (!run.command.text.empty()) {
@@ -96,34 +92,21 @@ std::string CheckLine(const Run& run) {
 }
 
 std::string JsonLine(const Run& run, bool show_passwords) {
+  // clang-format off
   Json calls = Json::array();
   for (const ToolCall& call : run.calls) {
-    const ToolOutcome outcome = call.exit_code ? OutcomeOf(call.verb, *call.exit_code) : ToolOutcome{};
-    calls.push_back({{"verb", call.verb},
-                     {"exit_code", call.exit_code ? Json(*call.exit_code) : Json()},
-                     {"result", !call.exit_code  ? "unknown"
-                                : outcome.failed ? "problem"
-                                                 : "ok"},
-                     {"meaning", call.exit_code ? outcome.meaning : "no exit code"},
-                     {"command", Shown(call, show_passwords)},
-                     {"command_cut", call.command.cut}});
+    calls.push_back({
+        {"verb", call.verb}, {"exit_code", call.exit_code ? Json(*call.exit_code) : Json()}, {"result", call.result},
+        {"meaning", call.meaning}, {"command", Shown(call, show_passwords)}, {"command_cut", call.command.cut}});
   }
-  return JsonText({{"file", OrNull(run.file)},
-                   {"line", run.line},
-                   {"run", run.number},
-                   {"verdict", run.Verdict()},
-                   {"reason", OrNull(run.Reason())},
-                   {"machine_type", OrNull(run.machine_type)},
-                   {"operating_system", OrNull(run.system)},
-                   {"architecture", OrNull(run.architecture)},
-                   {"mode", run.mode},
-                   {"package", run.package},
-                   {"package_version", OrNull(run.package_version)},
-                   {"ruv", run.ruv},
-                   {"command", OrNull(Shown(run.command.text, show_passwords))},
-                   {"command_cut", run.command.cut},
-                   {"tool_calls", calls}}) +
-         "\n";
+  return JsonText({
+      {"file", OrNull(run.file)}, {"line", run.line}, {"run", run.number}, {"verdict", run.Verdict()},
+      {"reason", OrNull(run.Reason())}, {"machine_type", OrNull(run.machine_type)},
+      {"operating_system", OrNull(run.system)}, {"architecture", OrNull(run.architecture)}, {"mode", run.mode},
+      {"package", run.package}, {"package_version", OrNull(run.package_version)}, {"ruv", run.ruv},
+      {"command", OrNull(Shown(run.command.text, show_passwords))}, {"command_cut", run.command.cut},
+      {"tool_calls", calls}}) + "\n";
+  // clang-format on
 }
 
 std::string Printable(const std::string& text) {

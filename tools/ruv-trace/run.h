@@ -1,4 +1,4 @@
-// One run of the launcher, as its trace shows it.
+// One run of the launcher, as its trace shows it: how it is read, and how it is printed.
 #pragma once
 
 #include <optional>
@@ -9,7 +9,7 @@
 namespace ruv_trace {
 
 struct Command {
-  std::string text = "";
+  std::string text;
   bool cut = false;  // the end may be missing
 };
 
@@ -17,6 +17,7 @@ struct ToolCall {
   std::string verb;
   Command command;
   std::optional<int> exit_code = {};
+  std::string result = "unknown", meaning = "no exit code";
 };
 
 // The two ways in which a run ends without having done anything.
@@ -43,7 +44,7 @@ struct Run {
   Command command;  // of the application
   std::string ruv = "unknown";
 
-  std::string problem;                          // the first thing that failed
+  std::string problem;                               // the first thing that failed
   std::string stopped = "its beginning is missing";  // where the messages end; empty for a complete run
 
   const std::string& Reason() const { return problem.empty() ? stopped : problem; }
@@ -53,12 +54,6 @@ struct Run {
   }
 };
 
-// A message of the trace, without the launcher's prefix.
-struct Message {
-  std::string text;
-  std::string more = "";  // the lines after it that are not messages, each after a line feed
-};
-
 inline constexpr const char* kFirstMessage = "[Debug:] Enter: TAVMaster::TAVMaster()";
 inline constexpr const char* kLastMessage = "[Debug:] Exiting TAVMaster::~TAVMaster()";
 // While this is a run's last message, the lines that follow are the copy script's output.
@@ -66,18 +61,24 @@ inline constexpr const char* kCopyScriptMessage = "[Status:]CopyTAVToRUVFoler: c
 
 // True if the message is the expected one. An expected text that ends with a blank, [ or " is followed by a value.
 bool Matches(std::string_view message, std::string_view expected);
-// Sets what the messages say about the run, and the messages that can come next: none after the last one. Returns false
-// if the messages are not the beginning of a run's, in sequence.
-bool Read(const std::vector<Message>& messages, Run& run, std::vector<std::string>& expected);
+// Sets what the messages say about the run, and the messages that can come next: none after the last one. A message
+// contains also the lines after it that are not messages. Returns false if they are not the beginning of a run's.
+bool Read(const std::vector<std::string>& messages, Run& run, std::vector<std::string>& expected);
 
-struct ToolOutcome {
-  bool failed;
-  std::string meaning;
-  std::string package;  // its state afterwards; empty if the call does not change it
-};
-// Returns what an exit code of the package tool means. Finding no newer package is not a failure.
-ToolOutcome OutcomeOf(const std::string& verb, int exit_code);
+// Sets what the call's exit code means, and returns the package's state afterwards, or "" if the call does not change
+// it. Finding no newer package is not a failure.
+std::string TakeExitCode(ToolCall& call, int exit_code);
 // Returns the first line of the launcher's message for an exit code, or "" if there is none.
 std::string ErrorText(int exit_code);
+
+inline constexpr const char* kTableHeader = "RUN VERDICT MACHINE DID    PACKAGE AND RUV, OR WHAT IS WRONG\n";
+// Return the run's line in the table, of at most 80 characters; the indented lines that --long adds; the line of
+// --check; the line of --json. All are in printable ASCII and end with a line feed.
+std::string TableLine(const Run& run);
+std::string Details(const Run& run, bool show_passwords);
+std::string CheckLine(const Run& run);
+std::string JsonLine(const Run& run, bool show_passwords);
+// Returns the text with everything but printable ASCII escaped.
+std::string Printable(const std::string& text);
 
 }  // namespace ruv_trace

@@ -12,22 +12,15 @@ using namespace NZEMRUVTAV;
 
 struct Verb {
   const std::string& name;
-  const char *success, *package_after_success, *package_after_failure;
+  const char *success, *package_after_success, *package_after_failure, *package_if_nothing_newer;
 };
 const Verb kVerbs[] = {
-    {TAVTOOL_CMD_COMPWEB, "update available", "available", "check_failed"},
-    {TAVTOOL_CMD_ACQUIRE, "success", "downloaded", "download_failed"},
-    {TAVTOOL_CMD_COMPLOC, "nothing newer", "nothing_newer", "check_failed"},
-    {TAVTOOL_CMD_EXPAND, "success", "expanded", "expansion_failed"},
-    {TAVTOOL_CMD_COPY, "success", "", ""},
+    {TAVTOOL_CMD_COMPWEB, "update available", "available", "check_failed", "nothing_newer"},
+    {TAVTOOL_CMD_ACQUIRE, "success", "downloaded", "download_failed", ""},
+    {TAVTOOL_CMD_COMPLOC, "nothing newer", "nothing_newer", "check_failed", "nothing_newer"},
+    {TAVTOOL_CMD_EXPAND, "success", "expanded", "expansion_failed", ""},
+    {TAVTOOL_CMD_COPY, "success", "", "", ""},
 };
-
-int ResultOf(int exit_code) {
-  for (const ToolResult& known : kToolResults) {
-    if (known.exit_code == exit_code) return known.result;
-  }
-  return kFailure;
-}
 
 std::string FailureText(int exit_code) {
   const std::string text = ErrorText(exit_code);
@@ -41,26 +34,27 @@ std::string FailureText(int exit_code) {
 }  // namespace
 
 std::string ErrorText(int exit_code) {
-  for (const ErrMsg& known : ErrMsgs) {
-    const std::string message = known.message;
-    if (known.exit_code == exit_code) return message.substr(0, message.find('\n'));
-  }
-  return "";
+  const std::string message = MessageOf(exit_code);
+  return message.substr(0, message.find('\n'));
 }
 
-ToolOutcome OutcomeOf(const std::string& name, int exit_code) {
-  const Verb& verb = *std::find_if(std::begin(kVerbs), std::end(kVerbs), [&](const Verb& v) { return v.name == name; });
-  const bool compares = name == TAVTOOL_CMD_COMPLOC, expands = name == TAVTOOL_CMD_EXPAND;
+std::string TakeExitCode(ToolCall& call, int exit_code) {
+  const auto is = [&](const Verb& each) { return each.name == call.verb; };
+  const Verb& verb = *std::find_if(std::begin(kVerbs), std::end(kVerbs), is);
+  const bool compares = call.verb == TAVTOOL_CMD_COMPLOC, expands = call.verb == TAVTOOL_CMD_EXPAND;
   const int result = ResultOf(exit_code);
-  if (result == kSuccess) return {false, verb.success, verb.package_after_success};
-  if (result == kPackageToInstall && compares) return {false, "newer package", "available"};
-  if (result == kNoPayload && (compares || expands)) return {false, "no payload", verb.package_after_success};
-  if (result != kFailure) return {true, "unexpected exit code", verb.package_after_failure};
   // 30 is "You already have the latest version", the others "There's no update available".
   const bool nothing = exit_code == 30 || exit_code == 31 || exit_code == 33 || exit_code == 40;
-  const bool failed = !nothing || expands || name == TAVTOOL_CMD_ACQUIRE;
-  const char* nothing_newer = name == TAVTOOL_CMD_COPY ? "" : "nothing_newer";
-  return {failed, FailureText(exit_code), failed ? verb.package_after_failure : nothing_newer};
+  const bool expected = result == kSuccess || compares || (expands && result == kNoPayload);
+  const bool ok = result == kFailure ? nothing && !expands && call.verb != TAVTOOL_CMD_ACQUIRE : expected;
+  call.exit_code = exit_code;
+  call.result = ok ? "ok" : "problem";
+  call.meaning = result == kFailure ? FailureText(exit_code) : ok ? verb.success : "unexpected exit code";
+  if (result == kNoPayload && ok) call.meaning = "no payload";
+  if (result == kPackageToInstall && ok) call.meaning = "newer package";
+  if (!ok) return verb.package_after_failure;
+  if (result == kPackageToInstall) return "available";
+  return nothing ? verb.package_if_nothing_newer : verb.package_after_success;
 }
 
 }  // namespace ruv_trace

@@ -10,34 +10,20 @@ namespace {
 
 constexpr std::size_t kMostFollowed = 20;   // an unfinished run with that many after it is given up
 constexpr std::size_t kMostMessages = 500;  // of a run; an ordinary one has about fifty
-constexpr std::size_t kKeptText = 1024;     // of the lines after a message; more than the rest of a command
+constexpr std::size_t kKeptText = 1024;     // of a message with the lines after it; more than a command
 
 bool IsClosing(const std::string& message) {
-  return message == "[Debug:] Exiting TAVMaster::InvokeRUV()" ||
-         message == "[Debug:] Exiting TAVMaster::TAVMasterMain()" ||
-         message == "[Debug:] Entering TAVMaster::~TAVMaster()" || message == kLastMessage;
+  constexpr const char* kClosing[] = {"[Debug:] Exiting TAVMaster::InvokeRUV()",
+                                      "[Debug:] Exiting TAVMaster::TAVMasterMain()",
+                                      "[Debug:] Entering TAVMaster::~TAVMaster()", kLastMessage};
+  return std::find(std::begin(kClosing), std::end(kClosing), message) != std::end(kClosing);
 }
 
 }  // namespace
 
-bool TraceReader::Followed::Read() {
-  run = Run(run.number, run.file, run.line);
-  return ruv_trace::Read(messages, run, expected);
-}
-
 bool TraceReader::Followed::Fits(const std::string& text) const {
   return messages.size() < kMostMessages &&
          std::any_of(expected.begin(), expected.end(), [&](const std::string& each) { return Matches(text, each); });
-}
-
-void TraceReader::Followed::Mix() {
-  mixed = true;
-  for (Followed* rival : rivals) rival->mixed = true;
-}
-
-void TraceReader::BeginFile(const std::string& name) {
-  file_ = name;
-  line_ = 0;
 }
 
 bool TraceReader::Take(const std::string& line) {
@@ -52,10 +38,9 @@ bool TraceReader::Take(const std::string& line) {
     CatchUp();
     Begin();
     collects_ = true;
-    headless_ = false;
   }
   if (!collects_) return TakeMessage(text);
-  writer_->messages.push_back({text});
+  writer_->messages.push_back(text);
   if (text == kLastMessage || writer_->messages.size() == kMostMessages) CatchUp();
   return true;
 }
@@ -71,16 +56,16 @@ void TraceReader::CatchUp() {
   collects_ = false;
   Followed& newest = followed_.back();
   if (newest.Read()) {
-    for (const Message& message : newest.messages) NoteRivals(newest, message.text);
+    for (const std::string& message : newest.messages) NoteRivals(newest, message);
   } else {
-    const std::vector<Message> messages = std::move(newest.messages);
+    const std::vector<std::string> messages = std::move(newest.messages);
     newest.messages.clear();
     newest.expected = {kFirstMessage};
-    for (const Message& message : messages) {
-      TakeMessage(message.text);
-      std::istringstream more(message.more);
+    for (const std::string& message : messages) {
+      std::istringstream lines(message);
       std::string line;
-      for (std::getline(more, line); std::getline(more, line);) TakeOther(line);
+      std::getline(lines, line);
+      for (TakeMessage(line); std::getline(lines, line);) TakeOther(line);
     }
   }
   ReportAllBut(kMostFollowed);
@@ -92,7 +77,7 @@ bool TraceReader::TakeMessage(const std::string& text) {
   if (writer == followed_.rend()) return TakeStray(text);
   NoteRivals(*writer, text);
   if (!IsClosing(text) && !writer->rivals.empty()) writer->Mix();
-  writer->messages.push_back({text});
+  writer->messages.push_back(text);
   writer->Read();
   writer_ = &*writer;
   ReportAllBut(kMostFollowed);
@@ -113,25 +98,16 @@ bool TraceReader::TakeStray(const std::string& text) {
     TakeOther(text);
     return true;
   }
-  const bool is_last = text == kLastMessage;
-  if (IsClosing(text) && given_up_ > 0) {
-    if (is_last) --given_up_;
-    return true;
-  }
-  bool is_explained = headless_;
+  if (IsClosing(text)) return true;
+  bool is_explained = false;
   for (Followed& each : followed_) {
-    if (each.expected.empty()) continue;
-    each.Mix();
-    is_explained = true;
+    if (!each.expected.empty() && !each.messages.empty()) each.Mix();
+    is_explained = is_explained || !each.expected.empty();
   }
-  if (!is_explained) {
-    if (text.compare(0, 8, "[Debug:]") != 0 && text.compare(0, 9, "[Status:]") != 0) return false;
-    Begin();
-    followed_.back().expected.clear();
-    headless_ = true;
-    ReportAllBut(kMostFollowed);
-  }
-  if (is_last) headless_ = false;
+  if (is_explained) return true;
+  if (text.compare(0, 8, "[Debug:]") != 0 && text.compare(0, 9, "[Status:]") != 0) return false;
+  Begin();
+  followed_.back().expected = {kLastMessage};  // of a run whose beginning is missing
   return true;
 }
 
@@ -140,21 +116,16 @@ void TraceReader::TakeOther(const std::string& text) {
   Followed* writer = InCopyScript();
   if (writer == nullptr) writer = writer_;
   if (writer == nullptr || writer->messages.empty()) return;
-  std::string& more = writer->messages.back().more;
-  if (more.size() < kKeptText) more += "\n" + text.substr(0, kKeptText);
+  std::string& message = writer->messages.back();
+  if (message.size() < kKeptText) message += "\n" + text.substr(0, kKeptText);
 }
 
 // Returns the newest run that is in its copy script, or null.
 TraceReader::Followed* TraceReader::InCopyScript() {
   const auto run = std::find_if(followed_.rbegin(), followed_.rend(), [](const Followed& each) {
-    return !each.messages.empty() && Matches(each.messages.back().text, kCopyScriptMessage);
+    return !each.messages.empty() && Matches(each.messages.back(), kCopyScriptMessage);
   });
   return run == followed_.rend() ? nullptr : &*run;
-}
-
-void TraceReader::End() {
-  CatchUp();
-  ReportAllBut(0);
 }
 
 // Reports the runs before the oldest unfinished one, and enough others to follow no more than the limit.
@@ -162,10 +133,7 @@ void TraceReader::ReportAllBut(std::size_t limit) {
   while (!followed_.empty() && (followed_.front().expected.empty() || followed_.size() > limit)) {
     Followed& first = followed_.front();
     Run& run = first.run;
-    if (!first.expected.empty()) {
-      ++given_up_;
-      first.Read();  // again, with the lines after its last message
-    }
+    if (!first.expected.empty()) first.Read();  // again, with the lines after its last message
     if (first.mixed) {
       run = Run(run.number, run.file, run.line);
       run.stopped = "mixed with another run, or lines are missing";

@@ -5,7 +5,8 @@
 // - If it fits an older one as well, it may be that one's. If the older one was killed, nothing is wrong with that. But
 //   if it writes another message later, both are mixed: what each of them did is not known.
 // - A message that fits no run shows that some are missing: all unfinished runs are mixed.
-// - The messages after the application's end are the same in all runs: they mix no runs.
+// - The messages after the application's end are the same in all runs: they mix no runs, and mean nothing if they fit
+//   none.
 //
 // What this design gives up: if the newer of two overlapping runs is killed where the older one's next messages fit it,
 // the older one's end is taken for the newer one's. All unattended ways to start the launcher take a lock.
@@ -27,23 +28,29 @@ class TraceReader {
   explicit TraceReader(std::function<void(const Run&)> report) : report_(std::move(report)) {}
 
   // Goes on with another file. A run may have begun in the one before.
-  void BeginFile(const std::string& name);
+  void BeginFile(const std::string& name) { file_ = name, line_ = 0; }
   // Takes the next line, without its line feed. Returns true if it contains a message of a run.
   bool Take(const std::string& line);
   // Reports the runs that are followed: the trace ends here.
-  void End();
+  void End() { CatchUp(), ReportAllBut(0); }
 
  private:
   struct Followed {
     Run run;
-    std::vector<Message> messages = {};
+    std::vector<std::string> messages = {};
     std::vector<std::string> expected = {kFirstMessage};  // next; nothing after the last message
     bool mixed = false;
     std::set<Followed*> rivals = {};  // newer runs with messages that may be this one's
 
-    bool Read();
+    bool Read() {
+      run = Run(run.number, run.file, run.line);
+      return ruv_trace::Read(messages, run, expected);
+    }
+    void Mix() {
+      mixed = true;
+      for (Followed* rival : rivals) rival->mixed = true;
+    }
     bool Fits(const std::string& text) const;
-    void Mix();
   };
 
   void Begin();
@@ -61,8 +68,6 @@ class TraceReader {
   std::list<Followed> followed_;  // the runs since the oldest unfinished one
   Followed* writer_ = nullptr;    // of the last message
   bool collects_ = false;         // the last run's messages are read later, all at once
-  bool headless_ = false;         // the messages are those of a run whose beginning is missing
-  unsigned long given_up_ = 0;    // unfinished runs that are no longer followed
   std::string installed_;         // what the last copy script installed
 };
 
