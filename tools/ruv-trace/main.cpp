@@ -1,6 +1,6 @@
 // ruv-trace: summarises the trace of the launcher.
+#include <dirent.h>
 #include <getopt.h>
-#include <glob.h>
 #include <sys/stat.h>
 
 #include <algorithm>
@@ -103,17 +103,18 @@ std::string ReadFile(const std::string& name, TraceReader& reader, std::time_t& 
 // Returns the launcher's trace and, before it, the file that the last rotation renamed and has not compressed, if there
 // is one: ruvtav.log.1 or, with logrotate's dateext, ruvtav.log-20260301. Then there may be no new file yet.
 std::vector<std::string> DefaultFiles() {
-  const std::string trace = std::string(NZEMRUVTAV::kLogDirectory) + "/" + NZEMRUVTAV::kLogFile;
-  glob_t found = {};
-  glob((trace + "{.1,-[0-9]*}").c_str(), GLOB_BRACE, nullptr, &found);
+  const std::string directory = NZEMRUVTAV::kLogDirectory, log = NZEMRUVTAV::kLogFile, trace = directory + "/" + log;
   std::pair<std::time_t, std::string> newest;
   struct stat status = {};
-  for (std::size_t i = 0; i < found.gl_pathc; ++i) {
-    const std::string name = found.gl_pathv[i];
-    const bool compressed = name.find('.', trace.size() + 1) != std::string::npos;
-    if (!compressed && stat(name.c_str(), &status) == 0) newest = std::max(newest, {status.st_mtime, name});
+  DIR* const entries = opendir(directory.c_str());
+  for (const dirent* entry = nullptr; entries != nullptr && (entry = readdir(entries)) != nullptr;) {
+    const std::string name = entry->d_name, path = directory + "/" + name;
+    if (name.size() <= log.size() || name.compare(0, log.size(), log) != 0) continue;
+    const std::string rest = name.substr(log.size());
+    if (rest != ".1" && (rest[0] != '-' || rest.find_first_not_of("-0123456789") != std::string::npos)) continue;
+    if (stat(path.c_str(), &status) == 0) newest = std::max(newest, {status.st_mtime, path});
   }
-  globfree(&found);
+  if (entries != nullptr) closedir(entries);
   if (newest.second.empty()) return {trace};
   if (stat(trace.c_str(), &status) != 0) return {newest.second};
   return {newest.second, trace};
