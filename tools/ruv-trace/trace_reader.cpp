@@ -13,9 +13,9 @@ constexpr std::size_t kMostMessages = 500;  // of a run; an ordinary one has abo
 constexpr std::size_t kKeptText = 1024;     // of a message with the lines after it; more than a command
 
 bool IsClosing(const std::string& message) {
-  constexpr const char* kClosing[] = {"[Debug:] Exiting TAVMaster::InvokeRUV()",
-                                      "[Debug:] Exiting TAVMaster::TAVMasterMain()",
-                                      "[Debug:] Entering TAVMaster::~TAVMaster()", kLastMessage};
+  constexpr std::string_view kClosing[] = {"[Debug:] Exiting TAVMaster::InvokeRUV()",
+                                           "[Debug:] Exiting TAVMaster::TAVMasterMain()",
+                                           "[Debug:] Entering TAVMaster::~TAVMaster()", kLastMessage};
   return std::find(std::begin(kClosing), std::end(kClosing), message) != std::end(kClosing);
 }
 
@@ -86,8 +86,9 @@ bool TraceReader::TakeMessage(const std::string& text) {
 
 // Notes that the message, which goes to the writer, fits older runs as well.
 void TraceReader::NoteRivals(Followed& writer, const std::string& text) {
+  if (IsClosing(text)) return;
   for (Followed& older : followed_) {
-    if (&older == &writer || IsClosing(text)) return;
+    if (&older == &writer) return;
     if (older.Fits(text)) older.rivals.insert(&writer);
   }
 }
