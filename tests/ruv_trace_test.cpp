@@ -1,9 +1,5 @@
 // ruv-trace's reports, also of concurrent runs and damaged traces.
-#include <chrono>
-#include <cstdio>
-#include <cstdlib>
 #include <nlohmann/json.hpp>
-#include <random>
 #include <regex>
 #include <sstream>
 
@@ -11,6 +7,7 @@
 
 using nlohmann::json;
 using testing::ContainsRegex;
+using testing::MatchesRegex;
 
 namespace {
 
@@ -47,7 +44,7 @@ std::vector<Strings> Table(const std::string& text) {
   return rows;
 }
 
-std::string Joined(const Strings& lines, std::size_t begin = 0, std::size_t end = -1) {
+std::string Joined(const Strings& lines, std::size_t begin, std::size_t end = std::string::npos) {
   std::string text;
   for (std::size_t i = begin; i < std::min(end, lines.size()); ++i) text += lines[i] + "\n";
   return text;
@@ -78,6 +75,16 @@ std::string TraceOf(const Strings& arguments, std::map<std::string, int> tool_co
 // Returns the trace up to and with the line that contains the text.
 std::string UpTo(const std::string& text, const std::string& trace) {
   return trace.substr(0, trace.find('\n', trace.find(text)) + 1);
+}
+
+// Returns a trace put together from the pieces with these names; "3x" is three times x.
+std::string Composed(const std::string& names, const std::map<std::string, std::string>& pieces) {
+  std::string trace;
+  for (const std::string& name : Split(names, ' ')) {
+    const std::size_t digits = name.find_first_not_of("0123456789");
+    for (int i = digits == 0 ? 1 : std::stoi(name); i > 0; --i) trace += pieces.at(name.substr(digits));
+  }
+  return trace;
 }
 
 }  // namespace
@@ -199,42 +206,34 @@ TEST(RuvTrace, GivesTheMeaningOfExitCodes) {
 TEST(RuvTrace, ReportsInstallations) {
   const Installation machine;
   machine.OfferPackage();
-  const auto offer = [&](int code, const std::string& version = "2.31") {
-    machine.InstallTool({{"comparelocal", code}, {"compareweb", code}}, "Version=" + version + "\n");
-  };
-  const auto run = [&](const Strings& arguments = {"-b"}) {
-    machine.Run(arguments);
-    return LastRun(ReadFile(kTraceFile));
-  };
-  const std::string ran = ": copy script ran; ruv started";
-  int version = 100;
-  for (const char* script : {"printf x", "exit 3", "rm \"$0\"", "echo sh: \"$0\"; echo \"x $0: y\"",
-                             "printf '[TAVRUV]: [Status:]Return Code from tavtool = 9\\n[TAVRUV]: x\\nno line feed'"}) {
-    machine.InstallCopyScript(script);
-    offer(21, std::to_string(++version));
-    EXPECT_EQ(run(), "ok 1234 launch " + std::to_string(version) + ran) << script;
-  }
   const std::string script = std::string(kExpansionDirectory) + "/ruv/data/copy.sh";
-  offer(21);
-  WriteFile(script, "#!/no/such/shell\n");
-  EXPECT_EQ(run(), "problem 1234 launch copy script not run: not found; ruv started");
-  EXPECT_EQ(RunOf(ReadFile(kTraceFile)).at("package"), "copy_script_not_run");
-  machine.InstallCopyScript();
-  EXPECT_EQ(run(), "ok 1234 launch 2.31" + ran);
-  machine.InstallTool({{"comparelocal", 21}}, "Version=2.31\n");
-  EXPECT_EQ(run({"--update", "--update_m", "5678"}), "ok 5678 update 2.31: copy script ran; ruv not started");
-  EXPECT_EQ(run(), "ok 1234 launch 2.31" + ran);
-  offer(31);
-  EXPECT_THAT(run({"--chkupd"}), StartsWith("ok "));  // says nothing about the installed package
-  offer(21);
-  EXPECT_EQ(run(), "problem 1234 launch 2.31 installed again, or a version th...; ruv started");
-  offer(0);
-  EXPECT_THAT(run(), StartsWith("ok 1234 launch package: nothing newer"));  // now it did take
-  offer(21);
-  EXPECT_EQ(run(), "ok 1234 launch 2.31" + ran);
-  fs::remove(script);
-  EXPECT_EQ(run(), "problem 1234 launch the package has no copy script; ruv started");
-  EXPECT_EQ(RunOf(ReadFile(kTraceFile)).at("package"), "no_copy_script");
+  // The run's arguments, the exit code of the comparisons, the copy script (nothing: none), and the listing.
+  for (const Strings& row : Table(
+           R"(-b                       | 21 | printf x       | ok 1234 launch 1.0: copy script ran; ruv started
+              --update --update_m 5678 | 0  | :              | ok 5678 update package: nothing newer; ruv not started
+              -b                       | 21 | exit 3         | ok 1234 launch 1.0: copy script ran; ruv started
+              --chkupd                 | 31 | :              | ok 1234 check package: nothing newer; ruv not started
+              -b                       | 21 | rm "$0"        | problem 1234 launch 1.0 installed again, or a version tha...; ruv started
+              -b                       | 0  | :              | ok 1234 launch package: nothing newer; ruv started
+              -b                       | 21 | #!/no/such     | problem 1234 launch copy script not run: not found; ruv started
+              -b                       | 21 | echo "x: $0: y"; echo sh: $0 | ok 1234 launch 1.0: copy script ran; ruv started
+              --update --update_m 5678 | 32 | :              | ok 5678 update package: nothing newer; ruv not started
+              -b                       | 21 | printf '[TAVRUV]: [Status:]Return Code from tavtool = 9\n[TAVRUV]: x\nno line feed' | ok 1234 launch 1.0: copy script ran; ruv started
+              -b -i /1/5678            | 21 | :              | ok 5678 launch 1.0: copy script ran; ruv started
+              -b                       | 21 | :              | ok 1234 launch 1.0: copy script ran; ruv started
+              -b                       | 21 |                | problem 1234 launch the package has no copy script; ruv started)")) {
+    const int code = std::stoi(row[1]);
+    machine.InstallTool({{"comparelocal", code}, {"compareweb", code == 21 ? 0 : code}}, "Version=1.0\n");
+    machine.InstallCopyScript(row[2]);
+    if (row[2][0] == '#') WriteFile(script, row[2] + "\n");
+    if (row[2].empty()) fs::remove(script);
+    machine.Run(Split(row[0], ' '));
+    EXPECT_EQ(LastRun(ReadFile(kTraceFile)), row[3]) << row[2];
+    const char* package = row[3].find("not run") != std::string::npos          ? "copy_script_not_run"
+                          : row[3].find("no copy script") != std::string::npos ? "no_copy_script"
+                                                                               : nullptr;
+    if (package != nullptr) EXPECT_EQ(RunOf(ReadFile(kTraceFile)).at("package"), package);
+  }
 }
 
 TEST(RuvTrace, ShowsCommands) {
@@ -288,20 +287,19 @@ TEST(RuvTrace, PrintsEveryField) {
 }
 
 TEST(RuvTrace, FollowsConcurrentRuns) {
-  const std::string launch = TraceOf({"-b"}), failed = TraceOf({"--chkupd"}, {{"compareweb", 42}});
-  std::map<std::string, std::string> pieces = {
-      {"launch", launch},          {"check", TraceOf({"--chkupd"})},
-      {"help", TraceOf({"-h"})},   {"complaint", "sh: 1: /tmp/tav/ruv/data/copy.sh: Permission denied\n"},
-      {"prefix", "[TAVRUV]: x\n"}, {"damaged", std::regex_replace(launch, std::regex(".*MT = .*\n"), "")}};
-  const auto cut = [&](const std::string& name, const std::string& text, const std::string& trace) {
-    pieces["in_" + name] = UpTo(text, trace);
-    pieces["after_" + name] = trace.substr(pieces["in_" + name].size());
-  };
-  cut("helper", "guihelper.sh", launch);
-  cut("tool", "CompareTAVPackage: TAVToolCmd", launch);
-  cut("script", "CopyTAVToRUVFoler: command", launch);
-  cut("ruv", "InvokeRUV: command", launch);
-  cut("check", "TAVToolCmd", failed);
+  const std::string launch = TraceOf({"-b"});
+  std::map<std::string, std::string> pieces = {{"launch", launch}, {"check", TraceOf({"--chkupd"})}};
+  pieces["help"] = TraceOf({"-h"});
+  pieces["prefix"] = "[TAVRUV]: x\n";
+  pieces["complaint"] = "sh: 1: /tmp/tav/ruv/data/copy.sh: Permission denied\n";
+  pieces["damaged"] = std::regex_replace(launch, std::regex(".*MT = .*\n"), "");
+  for (const Strings& row : Table("helper|guihelper.sh\ntool|CompareTAVPackage: T\nscript|copy.sh\nruv|InvokeRUV: c")) {
+    pieces["in_" + row[0]] = UpTo(row[1], launch);
+    pieces["after_" + row[0]] = launch.substr(pieces["in_" + row[0]].size());
+  }
+  const std::string failed = TraceOf({"--chkupd"}, {{"compareweb", 42}});
+  pieces["in_check"] = UpTo("TAVToolCmd", failed);
+  pieces["after_check"] = failed.substr(pieces["in_check"].size());
   // The pieces, the numbers of verdicts (ok, problem, unknown, none), and what is said of the first run.
   for (
       const Strings& row : Table(
@@ -324,16 +322,9 @@ TEST(RuvTrace, FollowsConcurrentRuns) {
               after_ruv prefix launch                       | 1 0 0 0  | ok      1234    launch 2.31
               in_ruv prefix after_ruv                       | 0 0 1 0  | unknown \?       \?      mixed
               damaged check                                 | 1 0 1 0  | unknown \?       \?      mixed)")) {
-    std::string trace;
-    for (const std::string& word : Split(row[0], ' ')) {
-      const std::size_t digits = word.find_first_not_of("0123456789");
-      const int times = digits == 0 ? 1 : std::stoi(word);
-      for (int i = 0; i < times; ++i) trace += pieces.at(word.substr(digits));
-    }
-    const Strings counts = Split(row[1], ' ');
-    EXPECT_THAT(ReportOf(trace), AllOf(HasSubstr(": " + counts[0] + " ok, " + counts[1] + " problem, " + counts[2] +
-                                                 " unknown, " + counts[3] + " none"),
-                                       ContainsRegex("\n  1 " + row[2])))
+    const std::string totals =
+        std::regex_replace(row[1], std::regex("(.+) (.+) (.+) (.+)"), ": $1 ok, $2 problem, $3 unknown, $4 none\n");
+    EXPECT_THAT(ReportOf(Composed(row[0], pieces)), AllOf(EndsWith(totals), ContainsRegex("\n  1 " + row[2])))
         << row[0];
   }
 }
@@ -345,97 +336,72 @@ TEST(RuvTrace, HidesPasswordsAndControlCharacters) {
       {{"--VMWARE-ESXI", "me:secret@h"}, "--vmware-esxi ***"},
       {{"--remote-zfld", "me:secret -secret@h"}, "--remote-zfld ***"},
       {{"-t", "\" -m secret"}, "-t ***"},
-      {{"-t", "me:x\n-secret@h"}, "-t ***"},
-      {{"x\n-t", "secret-"}, "x\\n-t ***"},
+      {{"x\n-t", "me:x\n-secret@h"}, "x\\n-t ***"},
       {{"--proxy-user=me", "--Proxy-Password=x 2>secret -x"}, "--proxy-user=me --Proxy-Password ***"},
       {{"--proxy-user=me:secret"}, "--proxy-user ***"},
       {{"--proxy-address=h", "--proxy-port=8"}, "--proxy-address=h --proxy-port=8"},
       {{"--proxy-address=http://me:secret@h", "-v"}, "--proxy-address ***"},
       {{"-text", "-x-t", "\\\"\xc3\xb6\x07\x7f\n\xfe-"}, "-text -x-t \\\"\\u00f6\\u0007\\u007f\\n\\ufffd-"},
   };
-  const Installation machine;
   for (const auto& [arguments, shown] : rows) {
-    machine.Run(arguments);
-    const std::string report = Report("--long");
-    EXPECT_THAT(report, HasSubstr("/ruv\" " + shown + " 2>/dev/null\n"));
-    for (const std::string& option : {" --long", " --json", " --check", " --check --json"}) {
+    EXPECT_THAT(ReportOf(TraceOf(arguments), "--long"), HasSubstr("/ruv\" " + shown + " 2>/dev/null\n"));
+    for (const char* option : {"--long", "--json", "--check"}) {
       EXPECT_THAT(Report(option), Not(AnyOf(HasSubstr("secret"), ContainsRegex("[\x01-\x09\x0b-\x1f\x7f-\xff]"))));
     }
     EXPECT_EQ(Report("--long --show-passwords").find("secret") != std::string::npos,
-              report.find("***") != std::string::npos);
-    fs::remove(kTraceFile);
+              shown.find("***") != std::string::npos);
   }
   EXPECT_THAT(ReportOf(TraceOf({"--chkupd", "--proxy-password=secret"}), "--long"),
               HasSubstr(" -m 1234 -o rhel5 -a 64 --latest --proxy-password *** 2>/dev/null 1>/dev/null 2>&1\n"));
-  WriteFile(kSystemInformationFile, "ZEM_SYSTEM_MT=\xc3\xa4\xe2\x82\xac\x1b\xff\n");
-  fs::remove(kTraceFile);
-  machine.Run({"-b"});
-  EXPECT_THAT(Report(), HasSubstr("  1 ok      \\u00... launch"));
-  EXPECT_EQ(RunOf(ReadFile(kTraceFile)).at("machine_type"), "\xc3\xa4\xe2\x82\xac\x1b\xef\xbf\xbd");
-}
-
-TEST(RuvTrace, SurvivesDamage) {
-  const std::string trace = TraceOf({"-b"}) + TraceOf({"--update"}) + TraceOf({"--ipmi-lan"});
-  for (unsigned seed = 1; seed <= 60; ++seed) {
-    SCOPED_TRACE(seed);
-    std::mt19937 random(seed);
-    const auto below = [&](std::size_t limit) { return static_cast<std::size_t>(random()) % limit; };
-    std::string damaged = trace;
-    for (int i = 0; i < 5; ++i) {
-      damaged[below(damaged.size())] = static_cast<char>(below(256));
-      damaged.erase(below(damaged.size()), below(60));
-      damaged.insert(below(damaged.size()), damaged.substr(below(damaged.size()), below(400)));
-    }
-    for (const std::string& line : Split(ReportOf(damaged, "--long"), '\n')) {
-      EXPECT_THAT(line, Not(ContainsRegex("[\x01-\x09\x0b-\x1f\x7f-\xff]")));
-      EXPECT_TRUE(line.substr(0, 6) == "      " || line.size() <= 80U) << line;
-    }
-  }
+  const std::string type = "\xc3\xa4\xe2\x82\xac\x1b";
+  const std::string trace = std::regex_replace(TraceOf({"-b"}), std::regex(" 1234"), " " + type);
+  EXPECT_THAT(ReportOf(trace), HasSubstr("  1 ok      \\u00... launch"));
+  EXPECT_EQ(RunOf(trace).at("machine_type"), type);
 }
 
 TEST(RuvTrace, JudgesTheLastRun) {
-  const std::string ok = TraceOf({"-b"}, {{"comparelocal", 0}}), bad = TraceOf({"-b"}, {{"expand", 60}});
-  const std::string look = TraceOf({"--chkupd"}), bad_look = TraceOf({"--chkupd"}, {{"compareweb", 42}});
-  const std::string help = TraceOf({"-h"}), cut = UpTo("TAVToolCmd", ok);
-  const std::string ok_line = "ok: package: nothing newer; ruv started (run ";
-  const std::string bad_line =
-      "problem: expand 60: Error, package corrupted or not enough free space on disk; ruv started";
-  const std::string look_line = "ok: package: available; ruv not started (run ";
-  const std::string bad_look_line =
-      "problem: compareweb 42: Unable to connect to update website; ruv not started (run ";
-  const std::pair<std::string, std::string> rows[] = {
-      {bad + ok, ok_line + "2)\n"},
-      {ok + look, ok_line + "1)\n"},
-      {bad + look, bad_line + " (run 1)\nstatus 2"},
-      {ok + bad_look, bad_look_line + "2)\nstatus 2"},
-      {ok + bad_look + look, ok_line + "1)\n"},
-      {bad + bad_look, bad_line + " (run 1)\nstatus 2"},
-      {bad_look + ok, ok_line + "2)\n"},
-      {look, look_line + "1)\n"},
-      {ok + help, ok_line + "1)\n"},
-      {bad_look + help, bad_look_line + "1)\nstatus 2"},
-      {ok + cut, "unknown: unfinished: in tavtool (run 2)\nstatus 3"},
-      {cut + ok, ok_line + "2)\n"},
-      {help, "unknown: no run that launched or updated\nstatus 3"},
-      {"[TAVRUV]: text\n", "unknown: no run of the launcher in /var/log/ZEM_Support/ruvtav.log\nstatus 3"},
-  };
-  for (const auto& [trace, line] : rows) {
-    EXPECT_EQ(ReportOf(trace, "--check"), line);
-    const std::string status = line.substr(line.find('\n') + 1), text = Report("--check --json");
-    EXPECT_EQ(text.substr(text.find('\n') + 1), status);
-    EXPECT_EQ(json::parse(text.substr(0, text.find('\n'))).at("verdict"), line.substr(0, line.find(':')));
+  const std::string ok = TraceOf({"-b"}, {{"comparelocal", 0}}), bad = TraceOf({"-b"}, {{"expand", 31}});
+  const std::map<std::string, std::string> pieces = {{"ok", ok},
+                                                     {"bad", bad},
+                                                     {"look", TraceOf({"--chkupd"})},
+                                                     {"cut", UpTo("TAVToolCmd", ok)},
+                                                     {"bad_look", TraceOf({"--chkupd"}, {{"compareweb", 45}})},
+                                                     {"help", TraceOf({"-h"})},
+                                                     {"text", "[TAVRUV]: x\n"}};
+  for (const Strings& row : Table(
+           R"(bad ok           | 0 ok: package: nothing newer; ruv started (run 2)
+              ok look          | 0 ok: package: nothing newer; ruv started (run 1)
+              ok bad_look      | 2 problem: compareweb 45: Couldn't ping KRO, maybe the KRO is down; ruv not started (run 2)
+              ok bad_look look | 0 ok: package: nothing newer; ruv started (run 1)
+              bad look         | 2 problem: expand 31: There's no update available for this system on internet currently; ruv started (run 1)
+              bad bad_look     | 2 problem: expand 31: There's no update available for this system on internet currently; ruv started (run 1)
+              bad_look ok      | 0 ok: package: nothing newer; ruv started (run 2)
+              look             | 0 ok: package: available; ruv not started (run 1)
+              ok help          | 0 ok: package: nothing newer; ruv started (run 1)
+              bad_look help    | 2 problem: compareweb 45: Couldn't ping KRO, maybe the KRO is down; ruv not started (run 1)
+              ok cut           | 3 unknown: unfinished: in tavtool (run 2)
+              cut ok           | 0 ok: package: nothing newer; ruv started (run 2)
+              help             | 3 unknown: no run that launched or updated
+              text             | 3 unknown: no run of the launcher in /var/log/ZEM_Support/ruvtav.log)")) {
+    const std::string status = row[1][0] == '0' ? "" : std::string("status ") + row[1][0], line = row[1].substr(2);
+    EXPECT_EQ(ReportOf(Composed(row[0], pieces), "--check"), line + "\n" + status);
+    const Strings lines = Split(Report("--check --json") + "\n", '\n');
+    EXPECT_EQ(json::parse(lines.at(0)).at("verdict"), line.substr(0, line.find(':')));
+    EXPECT_EQ(lines.at(1), status);
   }
-  EXPECT_EQ(ReportOf(ok + help + bad, "--problems"),
+  EXPECT_EQ(ReportOf(Composed("ok help bad", pieces), "--problems"),
             kHeader +
-                "  3 problem 1234    launch expand 60: Error, package corrupted o...; ruv started\n"
+                "  3 problem 1234    launch expand 31: There's no update availabl...; ruv started\n"
                 "3 runs: 1 ok, 1 problem, 0 unknown, 1 none\n");
   const std::string touch = std::string("touch -d '61 days ago' ") + kTraceFile + ";";
   ReportOf(ok);
-  EXPECT_EQ(Report("--check --max-age=61", touch), ok_line + "1)\n");
+  EXPECT_THAT(Report("--check --max-age=61", touch), StartsWith("ok: "));
   EXPECT_EQ(Report("--check --max-age=60"), "problem: no run for 61 days\nstatus 2");
+  EXPECT_EQ(Report("--check --max-age=0", std::string("touch -d '30 hours ago' ") + kTraceFile + ";"),
+            "problem: no run for 1 day\nstatus 2");
   EXPECT_EQ(Report("--check --json --max-age=0 | grep -c '\"run\":0,\"verdict\":\"problem\"'"), "1\n");
   ReportOf(bad);
-  EXPECT_EQ(Report("--check --max-age=1", touch), bad_line + " (run 1)\nstatus 2");
+  EXPECT_THAT(Report("--check --max-age=1", touch), StartsWith("problem: expand 31"));
 }
 
 TEST(RuvTrace, ReadsFilesInOrderAndRefusesOthers) {
@@ -478,14 +444,11 @@ TEST(RuvTrace, ReadsFilesInOrderAndRefusesOthers) {
 }
 
 TEST(RuvTrace, PrintsHelpVersionAndUsageErrors) {
-  const std::string help = Report("--help");
-  EXPECT_EQ(help, Report("-h"));
-  EXPECT_THAT(help, StartsWith("Usage: ruv-trace [OPTION]... [FILE]...\n"));
-  EXPECT_THAT(Split(help, '\n'), AllOf(SizeIs(testing::Le(20U)), testing::Each(SizeIs(testing::Le(80U)))));
-  EXPECT_THAT(Report("--version"), testing::MatchesRegex("ruv-trace [0-9]+\\.[0-9]+\\.[0-9]+\n"));
+  EXPECT_THAT(Report("--help"), MatchesRegex("Usage: ruv-trace (.{0,80}\n){15,20}"));
+  EXPECT_EQ(Report("--help"), Report("-h"));
+  EXPECT_THAT(Report("--version"), MatchesRegex("ruv-trace [0-9]+\\.[0-9]+\\.[0-9]+\n"));
   EXPECT_THAT(Report("--help >/dev/full"), EndsWith("status 1"));
-  EXPECT_THAT(Report("--no-such-option"), EndsWith("Try ruv-trace --help.\nstatus 64"));
-  for (const char* days : {"", "-1", "x", "1x"}) {
-    EXPECT_THAT(Report(std::string("--check --max-age=") + days), EndsWith("Try ruv-trace --help.\nstatus 64"));
+  for (const char* option : {"--no-such-option", "--max-age", "--max-age=", "--max-age=-1", "--max-age=1x"}) {
+    EXPECT_THAT(Report(option), EndsWith("Try ruv-trace --help.\nstatus 64"));
   }
 }
