@@ -232,7 +232,9 @@ TEST(RuvTrace, ReportsInstallations) {
     const char* package = row[3].find("not run") != std::string::npos          ? "copy_script_not_run"
                           : row[3].find("no copy script") != std::string::npos ? "no_copy_script"
                                                                                : nullptr;
-    if (package != nullptr) EXPECT_EQ(RunOf(ReadFile(kTraceFile)).at("package"), package);
+    if (package != nullptr) {
+      EXPECT_EQ(RunOf(ReadFile(kTraceFile)).at("package"), package);
+    }
   }
 }
 
