@@ -15,7 +15,6 @@
 #include "trace_reader.h"
 
 namespace {
-
 using namespace ruv_trace;
 
 constexpr const char* kHelp =
@@ -38,6 +37,8 @@ See ruv-trace(8) for the meaning of each word of the output.
 
 // Statuses of --check, as monitoring systems understand them, and of a wrong command line.
 enum ExitStatus : int { kOk = 0, kProblem = 2, kUnknown = 3, kUsageError = 64 };
+
+using Strings = std::vector<std::string>;
 
 struct {
   int json, with_details, problems_only, check, show_passwords;
@@ -65,9 +66,9 @@ void Print(const Run& run) {
 }
 
 // Reads a file of any size and content, in constant memory; "-" is standard input. What follows the last line feed is
-// not a line. Sets written to the file's time if that is later and the file contains runs. Returns why the file is
-// refused, or "".
-std::string ReadFile(const std::string& name, TraceReader& reader, std::time_t& written) {
+// not a line. Sets written to the file's time if that is later and the file contains runs. Adds a complaint if the file
+// is refused.
+void ReadFile(const std::string& name, TraceReader& reader, std::time_t& written, Strings& complaints) {
   static const std::pair<std::string_view, const char*> kCompressors[] = {
       {"\x1F\x8B", "zcat"}, {"\xFD\x37zXZ", "xzcat"}, {"BZh", "bzcat"}, {"\x28\xB5\x2F\xFD", "zstdcat"}};
   constexpr std::size_t kLongestLine = 65536;
@@ -82,7 +83,7 @@ std::string ReadFile(const std::string& name, TraceReader& reader, std::time_t& 
     std::string_view rest(buffer.data(), size);
     for (const auto& [magic, command] : kCompressors) {
       if (!empty || rest.substr(0, magic.size()) != magic) continue;
-      return name + " is compressed: in bash, write <(" + command + " " + name + ") instead";
+      return complaints.push_back(name + " is compressed: in bash, write <(" + command + " " + name + ") instead");
     }
     empty = false;
     for (std::size_t feed = 0; (feed = rest.find('\n')) != std::string_view::npos; rest.remove_prefix(feed + 1)) {
@@ -92,17 +93,20 @@ std::string ReadFile(const std::string& name, TraceReader& reader, std::time_t& 
     line.append(rest);
     if (line.size() > kLongestLine) line.erase(0, line.size() - kKeptEnd);
   }
-  if (!file || std::ferror(file.get()) != 0) {
-    return "cannot read " + name + ": " + std::strerror(errno) + (errno == EACCES ? "; root can" : "");
-  }
   struct stat status = {};
-  if (found && fstat(fileno(file.get()), &status) == 0) written = std::max(written, status.st_mtime);
-  return found || empty ? "" : "no run of the launcher in " + name;
+  if (!file || std::ferror(file.get()) != 0) {
+    const char* remedy = errno == EACCES ? "; root can" : "";
+    complaints.push_back("cannot read " + name + ": " + std::strerror(errno) + remedy);
+  } else if (found && fstat(fileno(file.get()), &status) == 0) {
+    written = std::max(written, status.st_mtime);
+  } else if (!empty) {
+    complaints.push_back("no run of the launcher in " + name);
+  }
 }
 
 // Returns the launcher's trace and, before it, the file that the last rotation renamed and has not compressed, if there
 // is one: ruvtav.log.1 or, with logrotate's dateext, ruvtav.log-20260301. Then there may be no new file yet.
-std::vector<std::string> DefaultFiles() {
+Strings DefaultFiles() {
   const std::string directory = NZEMRUVTAV::kLogDirectory, log = NZEMRUVTAV::kLogFile, trace = directory + "/" + log;
   std::pair<std::time_t, std::string> newest;
   struct stat status = {};
@@ -116,24 +120,25 @@ std::vector<std::string> DefaultFiles() {
   }
   if (entries != nullptr) closedir(entries);
   if (newest.second.empty()) return {trace};
-  if (stat(trace.c_str(), &status) != 0) return {newest.second};
-  return {newest.second, trace};
+  return stat(trace.c_str(), &status) == 0 ? Strings{newest.second, trace} : Strings{newest.second};
 }
 
-// Prints the one line of --check: about the run or, if there is none, why. Returns the status.
-int Check(Run run, const std::string& reason, std::time_t written) {
-  if (!reason.empty()) run.stopped = reason;
+// Prints the one line of --check, and returns the status. The complaint is about the first file that was refused.
+int Check(const Run& last, const Run& last_look, const std::string& complaint, std::time_t written) {
+  const bool look_counts = last.number == 0 || (last.Verdict() == "ok" && last_look.Verdict() != "ok");
+  Run run = look_counts && last_look.number != 0 ? last_look : last;
+  if (!complaint.empty()) run = Run();
+  if (run.number == 0) run.stopped = complaint.empty() ? "no run that launched or updated" : complaint;
   const long days = static_cast<long>((std::time(nullptr) - written) / 86400);
-  if (reason.empty() && options.max_age >= 0 && days > options.max_age && run.problem.empty()) {
+  if (complaint.empty() && options.max_age >= 0 && days > options.max_age && run.problem.empty()) {
     run = Run();
     run.problem = "no run for " + std::to_string(days) + (days == 1 ? " day" : " days");
   }
   Print(run);
-  if (!Written()) return kUnknown;
-  return run.Verdict() == "ok" ? kOk : run.Verdict() == "problem" ? kProblem : kUnknown;
+  return !Written() ? kUnknown : run.Verdict() == "ok" ? kOk : run.Verdict() == "problem" ? kProblem : kUnknown;
 }
 
-int Summarise(const std::vector<std::string>& names) {
+int Summarise(const Strings& names) {
   std::map<std::string, long> count;  // of each verdict
   Run last, last_look;  // that launched or updated, or may have; and that only looked for an update, since then
   TraceReader reader([&](const Run& run) {
@@ -144,20 +149,12 @@ int Summarise(const std::vector<std::string>& names) {
     last_look = run.mode == "check" ? run : Run();
     if (run.mode != "check") last = run;
   });
-  std::vector<std::string> complaints;
+  Strings complaints;
   std::time_t written = 0;
-  for (const std::string& name : names) {
-    const std::string complaint = ReadFile(name, reader, written);
-    if (!complaint.empty()) complaints.push_back(complaint);
-  }
+  for (const std::string& name : names) ReadFile(name, reader, written, complaints);
   reader.End();
   if (complaints.empty() && count.empty()) complaints.push_back("no run of the launcher in " + names.back());
-  if (options.check != 0) {
-    if (!complaints.empty()) return Check(Run(), complaints.front(), written);
-    const bool look_counts = last.number == 0 || (last.Verdict() == "ok" && last_look.Verdict() != "ok");
-    const Run& judged = look_counts && last_look.number != 0 ? last_look : last;
-    return Check(judged, judged.number == 0 ? "no run that launched or updated" : "", written);
-  }
+  if (options.check != 0) return Check(last, last_look, complaints.empty() ? "" : complaints.front(), written);
   const long ok = count["ok"], problem = count["problem"], unknown = count["unknown"], none = count["none"];
   const long runs = ok + problem + unknown + none;
   if (options.json == 0 && runs > 0) {
@@ -167,7 +164,6 @@ int Summarise(const std::vector<std::string>& names) {
   for (const std::string& complaint : complaints) Complain(complaint);
   return Written() && complaints.empty() ? EXIT_SUCCESS : EXIT_FAILURE;
 }
-
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -188,6 +184,6 @@ int main(int argc, char** argv) {
     std::fputs("Try ruv-trace --help.\n", stderr);
     return kUsageError;
   }
-  const std::vector<std::string> names(argv + optind, argv + argc);
+  const Strings names(argv + optind, argv + argc);
   return Summarise(names.empty() ? DefaultFiles() : names);
 }

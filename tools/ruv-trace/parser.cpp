@@ -6,21 +6,21 @@
 
 #include "launcher/command_fragments.h"
 #include "log/trace_format.h"
+#include "packages/exit_code_tables.h"
 #include "run.h"
 
 namespace ruv_trace {
 namespace {
-
 using namespace NZEMRUVTAV;
 
 constexpr const char* kBetweenSteps = "unfinished: between two steps";
+
+struct Stopped {};  // the message that the launcher writes next is not there
 
 struct Parser {
   const std::string *next_, *end_;
   Run& run_;
   std::vector<std::string>& expected_;
-
-  struct Stopped {};  // the message that the launcher writes next is not there
 
   // Reads the run up to its end or to where it stopped.
   bool Read() {
@@ -51,10 +51,9 @@ struct Parser {
 
   // The same, but the run stops if the message is not there. Until the next one the run is in this state.
   std::string Expect(const std::string& text, const char* state = kBetweenSteps) {
-    const auto value = Take(text);
-    if (!value) throw Stopped();
-    run_.stopped = state;
-    return *value;
+    const std::optional<std::string> value = Take(text);
+    run_.stopped = value ? state : run_.stopped;
+    return value ? *value : throw Stopped();
   }
 
   // Takes a command that ends with this redirection: an argument may contain line feeds. If it has none (because of
@@ -68,7 +67,6 @@ struct Parser {
     const std::size_t length = std::min({command.size(), command.find('\n'), longest});
     return {command.substr(0, length), length == longest || length < command.size()};
   }
-
   bool TakeEntry(const std::string& member) {
     return Take("[Debug:] Entering TAVMaster::" + member + "()").has_value();
   }
@@ -78,7 +76,6 @@ struct Parser {
   void Exit(const std::string& member, const char* state = kBetweenSteps) {
     Expect("[Debug:] Exiting TAVMaster::" + member + "()", state);
   }
-
   void Fail(const std::string& problem) {
     if (run_.problem.empty()) run_.problem = problem;
   }
@@ -141,7 +138,7 @@ struct Parser {
   // Every command of the package tool is followed by its exit code and, for some codes, their message.
   void HandleTAVToolReturnValue(const std::string& command, const std::string& verb) {
     run_.calls.push_back({verb, ExpectCommand(command, "unfinished: in tavtool", " 2>&1")});
-    ReadIdentity(run_.calls.back().command.text);
+    ReadIdentity(run_.calls.back().command);
     const std::string digits = Expect("[Status:]Return Code from tavtool = ");
     int code = 0;
     if (*std::from_chars(digits.c_str(), digits.c_str() + digits.size(), code).ptr != '\0') throw Stopped();
@@ -149,16 +146,18 @@ struct Parser {
     const std::string package = TakeExitCode(call, code);
     if (!package.empty()) run_.package = package;
     if (call.result == "problem") Fail(verb + " " + digits + ": " + call.meaning);
-    if (const std::string text = ErrorText(code); !text.empty()) Expect(text);
+    const std::string message = MessageOf(code);
+    if (!message.empty()) Expect(message.substr(0, message.find('\n')));
   }
   // PROGRAM VERB -l "PATH" [-s|-t "PATH"] -m TYPE -o SYSTEM -a ARCHITECTURE ...
-  void ReadIdentity(const std::string& command) {
-    const std::size_t type = command.find("\" -m "), system = command.find(" -o ", type);
-    const std::size_t architecture = command.find(" -a ", system), end = command.find(' ', architecture + 4);
+  void ReadIdentity(Command& command) {
+    const std::string& text = command.text;
+    const std::size_t type = command.arguments = text.find("\" -m "), system = text.find(" -o ", type);
+    const std::size_t architecture = text.find(" -a ", system), end = text.find(' ', architecture + 4);
     if (architecture == std::string::npos || end == std::string::npos) return;
-    run_.machine_type = command.substr(type + 5, system - type - 5);
-    run_.system = command.substr(system + 4, architecture - system - 4);
-    run_.architecture = command.substr(architecture + 4, end - architecture - 4);
+    run_.machine_type = text.substr(type + 5, system - type - 5);
+    run_.system = text.substr(system + 4, architecture - system - 4);
+    run_.architecture = text.substr(architecture + 4, end - architecture - 4);
   }
   void CheckUpdate() {
     HandleTAVToolReturnValue("[Status:]CheckUpdate:TAVToolCmd = ", TAVTOOL_CMD_COMPWEB);
@@ -229,7 +228,6 @@ struct Parser {
     run_.ruv = may_ask ? "started_or_declined" : "started";
   }
 };
-
 }  // namespace
 
 bool Matches(std::string_view message, std::string_view expected) {
@@ -241,5 +239,4 @@ bool Matches(std::string_view message, std::string_view expected) {
 bool Read(const std::vector<std::string>& messages, Run& run, std::vector<std::string>& expected) {
   return Parser{messages.data(), messages.data() + messages.size(), run, expected}.Read();
 }
-
 }  // namespace ruv_trace

@@ -6,34 +6,22 @@
 
 namespace ruv_trace {
 namespace {
-
 using Json = nlohmann::ordered_json;
 
-constexpr std::size_t kLineWidth = 80;
-
 // Returns JSON in printable ASCII.
-std::string JsonText(const Json& json) {
-  std::string text = json.dump(-1, ' ', true, Json::error_handler_t::replace);
-  for (std::size_t at = 0; (at = text.find('\x7F', at)) != std::string::npos;) text.replace(at, 1, "\\u007f");
-  return text;
-}
+std::string JsonText(const Json& json) { return json.dump(-1, ' ', true, Json::error_handler_t::replace); }
 
 // Hides everything after the first option whose value contains a password, up to the redirections: the trace does not
-// show where the value ends. The user's options begin at the given position.
-std::string Shown(const std::string& text, bool show_passwords, std::size_t begin = 0) {
+// show where the value ends.
+std::string Shown(const Command& command, bool show_passwords) {
   static const std::regex kPassword(
       R"(((?:|[\s\S]*?[\s"'])(?:-t|--ipmi-lan|--vmware-esxi|--remote-zfld|--proxy-password|--proxy-user(?=[\s\S]*:)|)"
       R"(--proxy-address(?=[\s\S]*@)))(?![a-z0-9])[\s\S]*?((?: 2>/dev/null| 1>/dev/null| 1>tav\.log| 2>&1)*))",
       std::regex::icase);
   std::smatch parts;
-  const std::string options = text.substr(std::min(begin, text.size()));
-  if (show_passwords || !std::regex_match(options, parts, kPassword)) return text;
-  return text.substr(0, begin) + parts.str(1) + " ***" + parts.str(2);
-}
-
-// "-t" is also an option of the package tool, before "-m".
-std::string Shown(const ToolCall& call, bool show_passwords) {
-  return Shown(call.command.text, show_passwords, call.command.text.find("\" -m "));
+  const std::string arguments = command.text.substr(std::min(command.arguments, command.text.size()));
+  if (show_passwords || !std::regex_match(arguments, parts, kPassword)) return command.text;
+  return command.text.substr(0, command.arguments) + parts.str(1) + " ***" + parts.str(2);
 }
 
 std::string Cell(const std::string& text, std::size_t width) {
@@ -41,16 +29,12 @@ std::string Cell(const std::string& text, std::size_t width) {
   return text + std::string(width - text.size(), ' ');
 }
 
-std::string InWords(std::string value) {
-  std::replace(value.begin(), value.end(), '_', ' ');
-  return value;
-}
-
 // Returns the reason or, without one, the package; and then, if it is certain, whether ruv was started.
 std::string Outcome(const Run& run, std::size_t width) {
-  const std::string package = run.package_version.empty() ? "package" : run.package_version;
-  std::string text = Printable(run.Reason().empty() ? package + ": " + InWords(run.package) : run.Reason());
-  std::string ruv = run.ruv == "unknown" ? "" : "; ruv " + InWords(run.ruv);
+  const std::string version = run.package_version.empty() ? "package" : run.package_version;
+  std::string package = version + ": " + run.package, ruv = run.ruv == "unknown" ? "" : "; ruv " + run.ruv;
+  for (std::string* words : {&package, &ruv}) std::replace(words->begin(), words->end(), '_', ' ');
+  std::string text = Printable(run.Reason().empty() ? package : run.Reason());
   // Only launch mode starts ruv: in the other modes this part may be dropped to save space.
   if (run.mode != "launch" && text.size() + ruv.size() > width) ruv.clear();
   if (text.size() + ruv.size() > width) text = Cell(text, width - ruv.size());
@@ -59,7 +43,6 @@ std::string Outcome(const Run& run, std::size_t width) {
 
 std::string OrUnknown(const std::string& text) { return text.empty() ? "?" : text; }
 Json OrNull(const std::string& text) { return text.empty() ? Json() : Json(text); }
-
 }  // namespace
 
 std::string TableLine(const Run& run) {
@@ -67,7 +50,7 @@ std::string TableLine(const Run& run) {
   const std::string columns = std::string(number.size() < 3 ? 3 - number.size() : 0, ' ') + number + " " +
                               Cell(run.Verdict(), 7) + " " + Cell(Printable(OrUnknown(run.machine_type)), 7) + " " +
                               Cell(run.mode == "unknown" ? "?" : run.mode, 6) + " ";
-  return columns + Outcome(run, kLineWidth - columns.size()) + "\n";
+  return columns + Outcome(run, 80 - columns.size()) + "\n";
 }
 
 std::string Details(const Run& run, bool show_passwords) {
@@ -76,13 +59,14 @@ std::string Details(const Run& run, bool show_passwords) {
   add("line " + std::to_string(run.line) + " of " + run.file + ", machine " + OrUnknown(run.machine_type) + " " +
       OrUnknown(run.system) + "/" + OrUnknown(run.architecture));
   if (!run.Reason().empty()) add("reason: " + run.Reason());
+  const auto add_command = [&](const std::string& name, const Command& command) {
+    add(name + Shown(command, show_passwords) + (command.cut ? "..." : ""));
+  };
   for (const ToolCall& call : run.calls) {
     add(call.verb + (call.exit_code ? " " + std::to_string(*call.exit_code) : "") + ": " + call.meaning);
-    add("  " + Shown(call, show_passwords) + (call.command.cut ? "..." : ""));
+    add_command("  ", call.command);
   }
-  if (!run.command.text.empty()) {
-    add("command: " + Shown(run.command.text, show_passwords) + (run.command.cut ? "..." : ""));
-  }
+  if (!run.command.text.empty()) add_command("command: ", run.command);
   return text;
 }
 
@@ -97,14 +81,14 @@ std::string JsonLine(const Run& run, bool show_passwords) {
   for (const ToolCall& call : run.calls) {
     calls.push_back({
         {"verb", call.verb}, {"exit_code", call.exit_code ? Json(*call.exit_code) : Json()}, {"result", call.result},
-        {"meaning", call.meaning}, {"command", Shown(call, show_passwords)}, {"command_cut", call.command.cut}});
+        {"meaning", call.meaning}, {"command", Shown(call.command, show_passwords)}, {"command_cut", call.command.cut}});
   }
   return JsonText({
       {"file", OrNull(run.file)}, {"line", run.line}, {"run", run.number}, {"verdict", run.Verdict()},
       {"reason", OrNull(run.Reason())}, {"machine_type", OrNull(run.machine_type)},
       {"operating_system", OrNull(run.system)}, {"architecture", OrNull(run.architecture)}, {"mode", run.mode},
       {"package", run.package}, {"package_version", OrNull(run.package_version)}, {"ruv", run.ruv},
-      {"command", OrNull(Shown(run.command.text, show_passwords))}, {"command_cut", run.command.cut},
+      {"command", OrNull(Shown(run.command, show_passwords))}, {"command_cut", run.command.cut},
       {"tool_calls", calls}}) + "\n";
   // clang-format on
 }
@@ -118,5 +102,4 @@ std::string Printable(const std::string& text) {
   }
   return printable;
 }
-
 }  // namespace ruv_trace

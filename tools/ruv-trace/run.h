@@ -7,10 +7,10 @@
 #include <vector>
 
 namespace ruv_trace {
-
 struct Command {
   std::string text;
-  bool cut = false;  // the end may be missing
+  bool cut = false;           // the end may be missing
+  std::size_t arguments = 0;  // where the user's arguments may begin
 };
 
 struct ToolCall {
@@ -68,8 +68,6 @@ bool Read(const std::vector<std::string>& messages, Run& run, std::vector<std::s
 // Sets what the call's exit code means, and returns the package's state afterwards, or "" if the call does not change
 // it. Finding no newer package is not a failure.
 std::string TakeExitCode(ToolCall& call, int exit_code);
-// Returns the first line of the launcher's message for an exit code, or "" if there is none.
-std::string ErrorText(int exit_code);
 
 inline constexpr const char* kTableHeader = "RUN VERDICT MACHINE DID    PACKAGE AND RUV, OR WHAT IS WRONG\n";
 // Return the run's line in the table, of at most 80 characters; the indented lines that --long adds; the line of
@@ -80,5 +78,4 @@ std::string CheckLine(const Run& run);
 std::string JsonLine(const Run& run, bool show_passwords);
 // Returns the text with everything but printable ASCII escaped.
 std::string Printable(const std::string& text);
-
 }  // namespace ruv_trace

@@ -7,7 +7,6 @@
 
 namespace ruv_trace {
 namespace {
-
 using namespace NZEMRUVTAV;
 
 struct Verb {
@@ -23,20 +22,14 @@ const Verb kVerbs[] = {
 };
 
 std::string FailureText(int exit_code) {
-  const std::string text = ErrorText(exit_code);
-  if (!text.empty()) return text.substr(0, text.find('.'));
+  const std::string message = MessageOf(exit_code);
+  if (!message.empty()) return message.substr(0, message.find_first_of(".\n"));
   if (exit_code == -1) return "the shell could not be started or waited for";
   if (exit_code == 126) return "tavtool cannot be executed";
   if (exit_code == 127) return "tavtool not found, or no shell could be started";
   return exit_code > 128 ? "unknown exit code, or ended by a signal" : "unknown exit code";
 }
-
 }  // namespace
-
-std::string ErrorText(int exit_code) {
-  const std::string message = MessageOf(exit_code);
-  return message.substr(0, message.find('\n'));
-}
 
 std::string TakeExitCode(ToolCall& call, int exit_code) {
   const auto is = [&](const Verb& each) { return each.name == call.verb; };
@@ -56,5 +49,4 @@ std::string TakeExitCode(ToolCall& call, int exit_code) {
   if (result == kPackageToInstall) return "available";
   return nothing ? verb.package_if_nothing_newer : verb.package_after_success;
 }
-
 }  // namespace ruv_trace

@@ -7,18 +7,15 @@
 
 namespace ruv_trace {
 namespace {
-
 constexpr std::size_t kMostFollowed = 20;   // an unfinished run with that many after it is given up
 constexpr std::size_t kMostMessages = 500;  // of a run; an ordinary one has about fifty
 constexpr std::size_t kKeptText = 1024;     // of a message with the lines after it; more than a command
 
 bool IsClosing(const std::string& message) {
-  constexpr std::string_view kClosing[] = {"[Debug:] Exiting TAVMaster::InvokeRUV()",
-                                           "[Debug:] Exiting TAVMaster::TAVMasterMain()",
-                                           "[Debug:] Entering TAVMaster::~TAVMaster()", kLastMessage};
-  return std::find(std::begin(kClosing), std::end(kClosing), message) != std::end(kClosing);
+  return message == kLastMessage || message == "[Debug:] Exiting TAVMaster::InvokeRUV()" ||
+         message == "[Debug:] Exiting TAVMaster::TAVMasterMain()" ||
+         message == "[Debug:] Entering TAVMaster::~TAVMaster()";
 }
-
 }  // namespace
 
 bool TraceReader::Followed::Fits(const std::string& text) const {
@@ -43,11 +40,6 @@ bool TraceReader::Take(const std::string& line) {
   writer_->messages.push_back(text);
   if (text == kLastMessage || writer_->messages.size() == kMostMessages) CatchUp();
   return true;
-}
-
-void TraceReader::Begin() {
-  followed_.push_back({Run(++runs_, file_, line_)});
-  writer_ = &followed_.back();
 }
 
 // Reads the messages that were collected. If they are those of one run they are read once; if not, one after the other.
@@ -154,5 +146,4 @@ void TraceReader::ReportAllBut(std::size_t limit) {
     followed_.pop_front();
   }
 }
-
 }  // namespace ruv_trace

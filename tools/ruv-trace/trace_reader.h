@@ -21,7 +21,6 @@
 #include "run.h"
 
 namespace ruv_trace {
-
 class TraceReader {
  public:
   // report is called for each run, in the order in which they begin.
@@ -53,7 +52,10 @@ class TraceReader {
     bool Fits(const std::string& text) const;
   };
 
-  void Begin();
+  void Begin() {
+    followed_.push_back({Run(++runs_, file_, line_)});
+    writer_ = &followed_.back();
+  }
   void CatchUp();
   bool TakeMessage(const std::string& text);
   bool TakeStray(const std::string& text);
@@ -70,5 +72,4 @@ class TraceReader {
   bool collects_ = false;         // the last run's messages are read later, all at once
   std::string installed_;         // what the last copy script installed
 };
-
 }  // namespace ruv_trace
