@@ -265,7 +265,7 @@ TEST(RuvTrace, PrintsEveryField) {
   EXPECT_THAT(Report("--long"), HasSubstr("64\n      reason: unfinished: in tavtool\n      copy: no exit code\n"));
   EXPECT_THAT(ReportOf(trace, "--json"), AllOf(HasSubstr("\"package_version\":\"2.31\",\"ruv\":\"started\""),
                                                HasSubstr("\"verdict\":\"ok\",\"reason\":null")));
-  EXPECT_THAT(ReportOf(trace.substr(trace.find('\n') + 1), "--long"),
+  EXPECT_THAT(ReportOf(trace.substr(UpTo("Exiting", trace).size()), "--long"),
               HasSubstr("  1 unknown ?       ?      its beginning is missing\n      line 1 of /var/log/ZEM_Support/"
                         "ruvtav.log, machine ? ?/?\n      reason: its beginning is missing\n1 run: "));
 }
