@@ -274,6 +274,7 @@ TEST(RuvTrace, FollowsConcurrentRuns) {
   const std::string launch = TraceOf({"-b"});
   std::map<std::string, std::string> pieces = {{"launch", launch}, {"check", TraceOf({"--chkupd"})}};
   pieces["help"] = TraceOf({"-h"});
+  pieces["noisy"] = std::regex_replace(pieces["help"], std::regex("MT = .*\n"), "$&output of another program\n");
   pieces["prefix"] = "[TAVRUV]: x\n";
   pieces["complaint"] = "sh: 1: /tmp/tav/ruv/data/copy.sh: Permission denied\n";
   pieces["damaged"] = std::regex_replace(launch, std::regex(".*MT = .*\n"), "");
@@ -305,6 +306,7 @@ TEST(RuvTrace, FollowsConcurrentRuns) {
               after_tool check                              | 1 0 1 0  | unknown \?       \?      its beginning is missing
               after_ruv prefix launch                       | 1 0 0 0  | ok      1234    launch 2.31
               in_ruv prefix after_ruv                       | 0 0 1 0  | unknown \?       \?      mixed
+              noisy                                         | 0 0 0 1  | none    1234    \?      help shown
               damaged check                                 | 1 0 1 0  | unknown \?       \?      mixed)")) {
     const std::string totals =
         std::regex_replace(row[1], std::regex("(.+) (.+) (.+) (.+)"), ": $1 ok, $2 problem, $3 unknown, $4 none\n");
@@ -393,6 +395,8 @@ TEST(RuvTrace, ReadsFilesInOrderAndRefusesOthers) {
   const std::string trace = TraceOf({"-b"}), half = UpTo("TAVToolCmd", trace), rest = trace.substr(half.size());
   const std::string rotated = std::string(kTraceFile) + ".1", dated = std::string(kTraceFile) + "-20260301";
   const std::string one = "\n1 run: 1 ok, 0 problem, 0 unknown, 0 none\n", file = machine.Directory() + "/old";
+  WriteFile(rotated, half + TraceOf({"-h"}));
+  EXPECT_THAT(ReportOf(rest), EndsWith("\n2 runs: 1 ok, 0 problem, 0 unknown, 1 none\n"));
   WriteFile(rotated, half);
   EXPECT_THAT(ReportOf(rest), EndsWith(one));
   EXPECT_EQ(json::parse(Report("--json")).at("file"), rotated);
