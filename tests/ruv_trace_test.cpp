@@ -58,11 +58,12 @@ std::string LastRun(const std::string& trace) {
   return lines.size() < 3 ? "" : std::regex_replace(lines[lines.size() - 2].substr(4), std::regex(" +"), " ");
 }
 
-// Runs the launcher where a package can be installed, and returns the trace.
+// Runs the launcher where a package can be installed, and returns the trace. The launcher makes the repository itself
+// if the portable medium is /media.
 std::string TraceOf(const Strings& arguments, std::map<std::string, int> tool_codes = {},
                     const std::string& medium = "") {
   const Installation machine;
-  machine.CreateRepository();
+  if (medium != "/media") machine.CreateRepository();
   tool_codes.emplace("comparelocal", 21);
   machine.InstallTool(tool_codes, "Version=2.31\n");
   machine.InstallCopyScript("echo copied");
@@ -104,9 +105,10 @@ TEST(RuvTrace, FollowsTheLauncherStepByStep) {
       TAV                                   | unknown unfinished: between two steps
       [                                     | unknown unfinished: between two steps)");
   const Strings launch = {"-b", "--one", "--two", "-d", "x"};
-  for (const std::string& trace : {TraceOf(launch, {}, "/media"), TraceOf({"-b"}, {}, "/none"), TraceOf({"--update"}),
-                                   TraceOf({"--update"}, {}, "/media"), TraceOf({"--chkupd"}), TraceOf({"--ipmi-lan"}),
-                                   TraceOf({"--update"}, {{"compareweb", 40}})}) {
+  for (const std::string& trace :
+       {TraceOf(launch, {}, "/media"), TraceOf({"-b"}, {}, "/none"), TraceOf({"--update"}),
+        TraceOf({"--update"}, {}, "/media"), TraceOf({"--update"}, {}, "/none"), TraceOf({"--chkupd"}),
+        TraceOf({"--ipmi-lan"}), TraceOf({"--update"}, {{"compareweb", 40}})}) {
     const Strings lines = Split(trace, '\n');
     EXPECT_THAT(LastRun(trace), StartsWith("ok 1234 "));
     for (std::size_t i = 0; i + 1 < lines.size(); ++i) {
@@ -347,13 +349,16 @@ TEST(RuvTrace, HidesPasswordsAndControlCharacters) {
 
 TEST(RuvTrace, JudgesTheLastRun) {
   const std::string ok = TraceOf({"-b"}, {{"comparelocal", 0}}), bad = TraceOf({"-b"}, {{"expand", 31}});
-  const std::map<std::string, std::string> pieces = {{"ok", ok},
-                                                     {"bad", bad},
-                                                     {"look", TraceOf({"--chkupd"})},
-                                                     {"cut", UpTo("TAVToolCmd", ok)},
-                                                     {"bad_look", TraceOf({"--chkupd"}, {{"compareweb", 45}})},
-                                                     {"help", TraceOf({"-h"})},
-                                                     {"text", "[TAVRUV]: x\n"}};
+  const std::map<std::string, std::string> pieces = {
+      {"ok", ok},
+      {"bad", bad},
+      {"look", TraceOf({"--chkupd"})},
+      {"cut", UpTo("TAVToolCmd", ok)},
+      {"bad_look", TraceOf({"--chkupd"}, {{"compareweb", 45}})},
+      {"help", TraceOf({"-h"})},
+      {"text", "[TAVRUV]: x\n"},
+      {"cut_look", UpTo("TAVToolCmd", TraceOf({"--chkupd"}))},
+      {"cut_update", UpTo("AcquireUpdate: TAVToolCmd", TraceOf({"--update"}))}};
   for (const Strings& row : Table(
            R"(bad ok           | 0 ok: package: nothing newer; ruv started (run 2)
               ok look          | 0 ok: package: nothing newer; ruv started (run 1)
@@ -366,6 +371,8 @@ TEST(RuvTrace, JudgesTheLastRun) {
               ok help          | 0 ok: package: nothing newer; ruv started (run 1)
               bad_look help    | 2 problem: compareweb 45: Couldn't ping KRO, maybe the KRO is down; ruv not started (run 1)
               ok cut           | 3 unknown: unfinished: in tavtool (run 2)
+              bad cut_look     | 2 problem: expand 31: There's no update available for this system on internet currently; ruv started (run 1)
+              bad cut_update   | 3 unknown: unfinished: in tavtool (run 2)
               cut ok           | 0 ok: package: nothing newer; ruv started (run 2)
               help             | 3 unknown: no run that launched or updated
               text             | 3 unknown: no run of the launcher in /var/log/ZEM_Support/ruvtav.log)")) {
