@@ -8,8 +8,9 @@
 // - The messages after the application's end are the same in all runs: they mix no runs, and mean nothing if they fit
 //   none.
 //
-// What this design gives up: if the newer of two overlapping runs is killed where the older one's next messages fit it,
-// the older one's end is taken for the newer one's. All unattended ways to start the launcher take a lock.
+// What this design gives up: if one of several overlapping runs is killed where another one's later messages fit it, it
+// may be taken for complete. A complete run is never judged by another one's messages. All unattended ways to start the
+// launcher take a lock.
 #pragma once
 
 #include <functional>
