@@ -207,7 +207,7 @@ TEST(RuvTrace, PrintsEveryField) {
           R"("meaning":"no exit code","command":"\"@/tavtool\" copy -l \"@/media/update\" -t )"
           R"(\"/var/ZEM_Support\" -m 1234 -o rhel5 -a 64 1>/dev/null 2>&1","command_cut":false}]})"));
   EXPECT_THAT(Report("--long"), HasSubstr("64\n      reason: unfinished: in tavtool\n      copy: no exit code\n"));
-  EXPECT_THAT(ReportOf(Composed("-b>Exiting"), "--long"), HasSubstr("? ?/?\n      reason: its beginning is missing\n"));
+  EXPECT_THAT(ReportOf(Composed("-b>Exiting"), "--long"), ContainsRegex("line 1 of .* . ./.\n *reason: its beginning"));
   // The application's command, which the launcher may have cut, and what follows it in the trace.
   const std::string x(457, 'x'), end = " 2>/dev/null";
   for (const auto& [traced, shown] : std::vector<std::pair<std::string, std::string>>{
@@ -324,9 +324,8 @@ TEST(RuvTrace, ReadsFilesInOrderAndRefusesOthers) {
   EXPECT_THAT(Report("--check"), StartsWith("ok: "));
   for (const Strings& row : {Strings{"gzip", "zcat"}, {"xz", "xzcat"}, {"bzip2", "bzcat"}, {"zstd", "zstdcat"}}) {
     if (std::system((row[0] + " <" + dated + " >" + dated + ".gz 2>/dev/null").c_str()) != 0) continue;
-    EXPECT_EQ(
-        Report("--check " + dated + " " + dated + ".gz"),
-        "unknown: " + dated + ".gz is compressed: in bash, write <(" + row[1] + " " + dated + ".gz) instead\nstatus 3");
+    EXPECT_THAT(Report("--check " + dated + " " + dated + ".gz"),
+                EndsWith(".gz is compressed: in bash, write <(" + row[1] + " " + dated + ".gz) instead\nstatus 3"));
   }
   EXPECT_THAT(Report("--check /tmp/none"), "unknown: cannot read /tmp/none: No such file or directory\nstatus 3");
   EXPECT_THAT(Report("/tmp"), EndsWith("cannot read /tmp: Is a directory\nstatus 1"));
