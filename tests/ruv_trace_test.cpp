@@ -197,17 +197,16 @@ TEST(RuvTrace, PrintsEveryField) {
 1 run: 1 ok, 0 problem, 0 unknown, 0 none
 )");
   EXPECT_THAT(Report("--json"), ContainsRegex("\"reason\":null.*_version\":\"2.31\",\"ruv\":\"started\""));
-  EXPECT_THAT(
-      ReportOf(Composed("-b:/media<TAVToolCmd"), "--json"),
-      StartsWith(
-          R"({"file":"/var/log/ZEM_Support/ruvtav.log","line":1,"run":1,"verdict":"unknown",)"
-          R"("reason":"unfinished: in tavtool","machine_type":"1234","operating_system":"rhel5","architecture":"64",)"
-          R"("mode":"launch","package":"unknown","package_version":null,"ruv":"unknown","command":null,)"
-          R"("command_cut":false,"tool_calls":[{"verb":"copy","exit_code":null,"result":"unknown",)"
-          R"("meaning":"no exit code","command":"\"@/tavtool\" copy -l \"@/media/update\" -t )"
-          R"(\"/var/ZEM_Support\" -m 1234 -o rhel5 -a 64 1>/dev/null 2>&1","command_cut":false}]})"));
-  EXPECT_THAT(Report("--long"), HasSubstr("64\n      reason: unfinished: in tavtool\n      copy: no exit code\n"));
-  EXPECT_THAT(ReportOf(Composed("-b>Exiting"), "--long"), ContainsRegex("line 1 of .* . ./.\n *reason: its beginning"));
+  EXPECT_EQ(ReportOf(Composed("--chkupd,--update_m,5678,--update_os,sles11,--update_arch,32<Cmd"), "--json"),
+            R"({"file":"/var/log/ZEM_Support/ruvtav.log","line":1,"run":1,"verdict":"unknown",)"
+            R"("reason":"unfinished: in tavtool","machine_type":"5678","operating_system":"sles11",)"
+            R"("architecture":"32","mode":"check","package":"unknown","package_version":null,"ruv":"unknown",)"
+            R"("command":null,"command_cut":false,"tool_calls":[{"verb":"compareweb","exit_code":null,)"
+            R"("result":"unknown","meaning":"no exit code","command":"\"@/tavtool\" compareweb -l \"@\" -m 5678 )"
+            R"(-o sles11 -a 32 --latest 2>/dev/null 1>/dev/null 2>&1","command_cut":false}]})"
+            "\n");
+  EXPECT_THAT(Report("--long"), HasSubstr("\n      reason: unfinished: in tavtool\n      compareweb: no exit code\n"));
+  EXPECT_THAT(ReportOf(Composed("-b>::TAV -b>Cmd"), "--long"), ContainsRegex("line 1 of.* ./.\n *reason.*line 37 of"));
   // The application's command, which the launcher may have cut, and what follows it in the trace.
   const std::string x(457, 'x'), end = " 2>/dev/null";
   for (const auto& [traced, shown] : std::vector<std::pair<std::string, std::string>>{
@@ -227,7 +226,7 @@ TEST(RuvTrace, FollowsConcurrentRuns) {
   for (const Strings& row : Table(
            R"(-b<guihelper.sh -b                           | 1 0 1 0  | unknown ? ? unfinished: in guihelper
               -b<Cmd -b                                    | 1 0 1 0  | unknown 1234 launch unfinished: in tavtool
-              -b<Cmd -h -b>Cmd                             | 1 0 0 1  | ok 1234 launch 2.31
+              --chkupd:compareweb=42<Cmd -h --chkupd:compareweb=42>Cmd | 0 1 0 1 | problem 1234 check compareweb 42
               -b</ruv" 19x--chkupd -b>/ruv"                | 20 0 0 0 | ok 1234 launch 2.31
               -b</ruv" 20x--chkupd -b>/ruv"                | 20 0 1 0 | unknown 1234 launch unfinished: in ruv
               2x-b<Cmd -b>Cmd                              | 1 0 1 0  | unknown 1234 launch unfinished: in tavtool
@@ -282,7 +281,7 @@ TEST(RuvTrace, JudgesTheLastRun) {
               -b:comparelocal=0 --chkupd:compareweb=42          | 2 problem: compareweb 42: Unable to connect to update website; ruv not started (run 2)
               -b:comparelocal=0 --chkupd:compareweb=42 --chkupd | 0 ok: package: nothing newer; ruv started (run 1)
               -b:expand=51 --chkupd                             | 2 problem: expand 51: Error, package corrupted or not enough free space on disk; ruv started (run 1)
-              -b:expand=51 --chkupd:compareweb=42               | 2 problem: expand 51: Error, package corrupted or not enough free space on disk; ruv started (run 1)
+              -b -b --chkupd:compareweb=42                      | 2 problem: 2.31 installed again, or a version that begins with it; ruv started (run 2)
               --chkupd:compareweb=42 -b:comparelocal=0          | 0 ok: package: nothing newer; ruv started (run 2)
               --chkupd                                          | 0 ok: package: available; ruv not started (run 1)
               --chkupd:compareweb=42 -h                         | 2 problem: compareweb 42: Unable to connect to update website; ruv not started (run 1)
