@@ -10,73 +10,61 @@ const std::string kQuestion = "Do you want to proceed anyway (function may be li
 
 std::string Repeated(int count, const std::string& text) { return count == 0 ? "" : text + Repeated(count - 1, text); }
 
+// A prelude that gives the launcher this input, printf's format.
+std::string Input(const std::string& text) { return "printf '" + text + "' >input; exec <input"; }
+
 }  // namespace
 
 TEST(ApplicationLaunch, QuotesTheValuesOfSpecialParameters) {
-  struct Row {
-    Strings arguments;
-    std::string command;  // after the application's path
-    std::string traced;   // the messages about special parameters
+  const std::pair<Strings, std::string> rows[] = {
+      {{"-v", "-i", "/tmp/data.xml"}, " -v -i \"\"/tmp/data.xml\"\" 2>/dev/null"},
+      {{"-i", "/tmp/my-data.xml", "--show_stderr"}, " -i \"/tmp/my-data.xml\""},
+      {{"-html", "--x", "-d", "a b"}, " -html \"--x\" -d \"\"a b\"\" 2>/dev/null"},
+      {{"-d", "--show_stderr"}, " -d"},
+      {{"-r"}, " -r \"2>/dev/null\""},
+      {{"-d", "-r", "-r"}, " -d \"-r\" -r \"2>/dev/null\""},
+      {{"-D", "-ihtml", "-htm"}, " -D -ihtml -htm 2>/dev/null"},
   };
-  const auto processing = [](const std::string& option) {
-    return "[TAVRUV]: [Debug:] Processing special parameters [" + option + "]\n";
-  };
-  const std::string missing = "[TAVRUV]: [Error:]InvokeRUV: required parameters are missing for option = -d\n";
-  const Row rows[] = {
-      {{"-v", "-i", "/tmp/data.xml"}, " -v -i \"\"/tmp/data.xml\"\" 2>/dev/null", processing("-i")},
-      {{"-i", "/tmp/my-data.xml", "--show_stderr"}, " -i \"/tmp/my-data.xml\"", processing("-i")},
-      {{"-html", "--x", "-d", "a b"},
-       " -html \"--x\" -d \"\"a b\"\" 2>/dev/null",
-       processing("-html") + processing("-d")},
-      {{"-d", "--show_stderr"}, " -d", processing("-d") + missing},
-      {{"-r"}, " -r \"2>/dev/null\"", processing("-r")},
-      {{"-d", "-r", "-r"}, " -d \"-r\" -r \"2>/dev/null\"", processing("-d") + processing("-r")},
-      {{"-D", "-ihtml", "-htm"}, " -D -ihtml -htm 2>/dev/null", ""},
-  };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(PrintToString(row.arguments));
-    const Installation machine;
-    machine.Run(row.arguments);
-    EXPECT_THAT(machine.Trace(), HasSubstr("TAVMaster::InvokeRUV()\n" + row.traced +
-                                           "[TAVRUV]: [Status:]InvokeRUV: command = \"@/ruv\"" + row.command + "\n"));
-    EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(1));
+  const Installation machine;
+  for (const auto& [arguments, command] : rows) {
+    machine.Run(arguments);
+    EXPECT_EQ(machine.LastTraceLine("[Status:]InvokeRUV: command = "), "\"@/ruv\"" + command);
   }
+  EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(std::size(rows)));
+  EXPECT_THAT(machine.TraceLines("[Debug:] Processing special parameters "),
+              ElementsAre("[-i]", "[-i]", "[-html]", "[-d]", "[-d]", "[-r]", "[-d]", "[-r]"));
+  EXPECT_THAT(machine.TraceLines("[Error:]"),
+              ElementsAre("InvokeRUV: required parameters are missing for option = -d"));
 }
 
 TEST(ApplicationLaunch, AsksUntilTheAnswerIsYOrN) {
-  struct Row {
-    std::string input;
-    int questions;
-    Strings started;
-  };
-  const Row rows[] = {
-      {"y\n", 1, {"[-v]"}},
-      {"Y\n", 1, {"[-v]"}},
-      {"n\ny\n", 1, {}},
-      {"yes\nno\n y\n\nYy\ny \nN\n", 7, {}},
+  const std::tuple<std::string, int, Strings> rows[] = {
+      {"y\n", 1, {"[-v]"}},      {"Y\n", 1, {"[-v]"}}, {"n\ny\n", 1, {}}, {"yes\nno\n y\n\nYy\ny \nN\n", 7, {}},
       {"maybe\ny", 2, {"[-v]"}},  // a last line without a line feed
-      {"", 1, {}},                // the end of the input
-      {"what\n", 2, {}},
-      {std::string("y\0\ny\r\n", 6), 3, {}},
+      {"what\n", 2, {}},          // the end of the input
+      {"y\\0\ny\r\n", 3, {}},
   };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(row.input);
+  for (const auto& [input, questions, started] : rows) {
+    SCOPED_TRACE(input);
     const Installation machine;
     machine.MakeUnsupported();
-    const RunResult run = machine.Run({"-v"}, Input(row.input));
+    const RunResult run = machine.Run({"-v"}, Input(input));
     EXPECT_EQ(run.status, 0);
-    EXPECT_EQ(run.out, kWarning + Repeated(row.questions, kQuestion) + (row.started.empty() ? "Exit RUV\n" : ""));
-    EXPECT_EQ(machine.CallsOf("ruv"), row.started);
+    EXPECT_EQ(run.out, kWarning + Repeated(questions, kQuestion) + (started.empty() ? "Exit RUV\n" : ""));
+    EXPECT_EQ(machine.CallsOf("ruv"), started);
     EXPECT_THAT(machine.Trace(), HasSubstr("[Status:]InvokeRUV: command = \"@/ruv\" -v 2>/dev/null\n"
                                            "[TAVRUV]: [Debug:] Exiting TAVMaster::InvokeRUV()\n"));
   }
 }
 
-// The terminal is non-blocking, as another program may leave it. Each Ctrl-D (\004) ends a read, the second one empty.
+// Another program, here dd, may leave the terminal non-blocking. Each Ctrl-D (\004) ends a read, the second one empty.
 TEST(ApplicationLaunch, WaitsForTheAnswerAndAsksAgainAfterCtrlD) {
   const Installation machine;
   machine.MakeUnsupported();
-  EXPECT_EQ(machine.Run({}, Typed("maybe\004\004y\n")).out, kWarning + kQuestion + kQuestion);
+  const std::string prelude =
+      "exec 3>&1; (sleep 0.5; printf 'maybe\\004\\004y\\n') |"
+      " script -qc \"dd iflag=nonblock count=0 status=none; $launcher >&3 2>&3\" /dev/null >/dev/null; exit";
+  EXPECT_EQ(machine.Run({}, prelude).out, kWarning + kQuestion + kQuestion);
   EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre(""));
 }
 
@@ -84,7 +72,7 @@ TEST(ApplicationLaunch, TakesAnUnreadableAnswerAsNo) {
   const Installation machine;
   machine.MakeUnsupported();
   for (const char* input : {"exec </", "exec <&-"}) {
-    EXPECT_EQ(machine.Run({}, Prelude(input)).out, kWarning + kQuestion + "Exit RUV\n") << input;
+    EXPECT_EQ(machine.Run({}, input).out, kWarning + kQuestion + "Exit RUV\n") << input;
   }
   EXPECT_THAT(machine.CallsOf("ruv"), IsEmpty());
 }
@@ -94,7 +82,7 @@ TEST(ApplicationLaunch, LeavesTheInputAfterTheAnswerToTheApplication) {
   machine.MakeUnsupported();
   machine.Install("ruv", "cat");
   EXPECT_EQ(machine.Run({}, Input("y\nfor the application\n")).out, kWarning + kQuestion + "for the application\n");
-  EXPECT_EQ(machine.Run({}, Prelude("mkfifo pipe; printf 'y\\nthrough a pipe\\n' >pipe & exec <pipe")).out,
+  EXPECT_EQ(machine.Run({}, "mkfifo pipe; printf 'y\\nthrough a pipe\\n' >pipe & exec <pipe").out,
             kWarning + kQuestion + "through a pipe\n");
 }
 

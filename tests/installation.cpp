@@ -1,56 +1,27 @@
 #include "installation.h"
 
-#include <fcntl.h>
 #include <sys/wait.h>
-#include <unistd.h>
 
-#include <csignal>
 #include <cstdlib>
 #include <fstream>
+#include <regex>
 #include <sstream>
 #include <stdexcept>
 
 namespace {
 
-constexpr unsigned kTimeLimit = 20;  // seconds
-
 std::string RecordingProgram(const std::string& record, const std::string& then) {
   return "#!/bin/sh\n{ for argument; do printf '[%s]' \"$argument\"; done; echo; } >>'" + record + "'\n" + then + "\n";
 }
 
-int OpenTerminal() {
-  const int terminal = posix_openpt(O_RDWR | O_CLOEXEC | O_NOCTTY);
-  grantpt(terminal);
-  unlockpt(terminal);
-  return terminal;
-}
-
-void TypeAfterTheQuestion(int terminal, const std::string& text, const std::string& output) {
-  for (int wait = 0; wait < 1000 && ReadFile(output).find("(Y/N)") == std::string::npos; ++wait) usleep(10'000);
-  EXPECT_EQ(write(terminal, text.data(), text.size()), static_cast<ssize_t>(text.size()));
-}
-
-// Becomes a shell that becomes the launcher.
-[[noreturn]] void ExecuteLauncher(const std::string& directory, const Strings& arguments, const RunOptions& options,
-                                  const std::string& input) {
-  const int in = open(input.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY | (options.terminal ? O_NONBLOCK : 0));
-  const int out = open((directory + "/stdout").c_str(), O_WRONLY | O_CLOEXEC);
-  if (in < 0 || out < 0 || chdir((directory + "/cwd").c_str()) != 0) _exit(125);
-  dup2(in, STDIN_FILENO);
-  dup2(out, STDOUT_FILENO);
-  dup2(out, STDERR_FILENO);
-  setpgid(0, 0);
-  for (const int signal : {SIGINT, SIGPIPE, SIGXFSZ, SIGCHLD}) std::signal(signal, SIG_DFL);
-  alarm(kTimeLimit);
-  Strings words = {"sh", "-c",
-                   "unset ZEM_PORTABLE_EXEC_DIR\n" + options.prelude + "\nexec $with $RUV_TEST_WRAPPER \"$0\" \"$@\"",
-                   directory + "/launcher"};
-  words.insert(words.end(), arguments.begin(), arguments.end());
-  std::vector<char*> argv;
-  for (std::string& word : words) argv.push_back(word.data());
-  argv.push_back(nullptr);
-  execv("/bin/sh", argv.data());
-  _exit(126);
+// The rest of each line that begins with the prefix.
+Strings LinesOf(const std::string& text, const std::string& prefix) {
+  std::istringstream file(text);
+  Strings lines;
+  for (std::string line; std::getline(file, line);) {
+    if (line.compare(0, prefix.size(), prefix) == 0) lines.push_back(line.substr(prefix.size()));
+  }
+  return lines;
 }
 
 }  // namespace
@@ -86,11 +57,6 @@ Installation::Installation() {
   WriteFile(SupportListFile(), "<MT>1234</MT>\n");
 }
 
-Installation::~Installation() {
-  std::error_code ignored;
-  fs::remove_all(directory_, ignored);
-}
-
 void Installation::Install(const std::string& name, const std::string& then) const {
   const std::string path = directory_ + "/" + name;
   WriteFile(path, RecordingProgram(directory_ + "/calls." + name, then));
@@ -98,11 +64,8 @@ void Installation::Install(const std::string& name, const std::string& then) con
 }
 
 void Installation::InstallTool(const std::map<std::string, int>& exit_code_of_verb, const std::string& output) const {
-  std::string then = output.empty() ? "" : "printf '%s' '" + output + "'\n";
-  then += "case $1 in\n";
-  for (const auto& [verb, exit_code] : exit_code_of_verb) {
-    then += verb + ") exit " + std::to_string(exit_code) + " ;;\n";
-  }
+  std::string then = "printf '%s' '" + output + "'\ncase $1 in\n";
+  for (const auto& [verb, exit_code] : exit_code_of_verb) then += verb + ") exit " + std::to_string(exit_code) + ";;\n";
   Install("tavtool", then + "esac");
 }
 
@@ -111,37 +74,24 @@ void Installation::InstallCopyScript(const std::string& then) const {
             RecordingProgram(directory_ + "/calls.copy.sh", then));
 }
 
-void Installation::CreateRepository() const { fs::create_directory(kRepository); }
-
-void Installation::OfferPackage(int comparison) const {
+void Installation::OfferPackage(const std::string& tool_output) const {
   CreateRepository();
-  InstallTool({{"comparelocal", comparison}});
+  InstallTool({{"comparelocal", 21}}, tool_output);
   InstallCopyScript();
 }
 
-void Installation::MakeUnsupported() const { WriteFile(SupportListFile(), "<MT>9999</MT>\n"); }
-
-RunResult Installation::Run(const Strings& arguments, const RunOptions& options) const {
-  const std::string output = directory_ + "/stdout";
-  std::string input = directory_ + "/stdin";
-  WriteFile(output, "");
-  WriteFile(input, options.input);
-  const int terminal = options.terminal ? OpenTerminal() : -1;
-  if (options.terminal) input = ptsname(terminal);
-  const pid_t child = fork();
-  if (child == 0) ExecuteLauncher(directory_, arguments, options, input);
-  if (options.terminal) TypeAfterTheQuestion(terminal, options.input, output);
-  int status = 0;
-  waitpid(child, &status, 0);
-  if (options.terminal) close(terminal);
-  return {WIFEXITED(status) ? WEXITSTATUS(status) : 1000 + WTERMSIG(status), WithPlainDirectory(ReadFile(output))};
+RunResult Installation::Run(const Strings& arguments, const std::string& prelude) const {
+  std::string script = "cd '" + directory_ + "/cwd'; launcher='" + directory_ + "/launcher'\nset --";
+  for (const std::string& argument : arguments) script += " '" + argument + "'";
+  script += "\nunset ZEM_PORTABLE_EXEC_DIR\n" + prelude + "\nexec $with $RUV_TEST_WRAPPER \"$launcher\" \"$@\"\n";
+  WriteFile(directory_ + "/run", script);
+  const std::string command = "exec env --default-signal timeout 20 sh " + directory_ + "/run";
+  const int status = std::system((command + " </dev/null >" + directory_ + "/stdout 2>&1").c_str());
+  return {WEXITSTATUS(status), WithPlainDirectory(ReadFile(directory_ + "/stdout"))};
 }
 
 Strings Installation::CallsOf(const std::string& name) const {
-  std::ifstream file(directory_ + "/calls." + name);
-  Strings calls;
-  for (std::string line; std::getline(file, line);) calls.push_back(WithPlainDirectory(line));
-  return calls;
+  return LinesOf(WithPlainDirectory(ReadFile(directory_ + "/calls." + name)), "");
 }
 
 Strings Installation::ToolVerbs() const {
@@ -152,19 +102,13 @@ Strings Installation::ToolVerbs() const {
 
 std::string Installation::Trace() const { return WithPlainDirectory(ReadFile(kTraceFile)); }
 
-Strings Installation::TraceLines(const std::string& prefix) const {
-  const std::string wanted = "[TAVRUV]: " + prefix;
-  std::istringstream file(Trace());
-  Strings lines;
-  for (std::string line; std::getline(file, line);) {
-    if (line.compare(0, wanted.size(), wanted) == 0) lines.push_back(line.substr(wanted.size()));
-  }
-  return lines;
+Strings Installation::TraceLines(const std::string& prefix) const { return LinesOf(Trace(), "[TAVRUV]: " + prefix); }
+
+std::string Installation::LastTraceLine(const std::string& prefix) const {
+  const Strings lines = TraceLines(prefix);
+  return lines.empty() ? "none" : lines.back();
 }
 
-std::string Installation::WithPlainDirectory(std::string text) const {
-  for (std::size_t at = 0; (at = text.find(directory_, at)) != std::string::npos;) {
-    text.replace(at, directory_.size(), "@");
-  }
-  return text;
+std::string Installation::WithPlainDirectory(const std::string& text) const {
+  return std::regex_replace(text, std::regex(directory_), "@");
 }

@@ -11,16 +11,8 @@
 #include <vector>
 
 namespace fs = std::filesystem;
-using ::testing::AllOf;
-using ::testing::AnyOf;
-using ::testing::ElementsAre;
-using ::testing::EndsWith;
-using ::testing::HasSubstr;
-using ::testing::IsEmpty;
-using ::testing::Not;
-using ::testing::PrintToString;
-using ::testing::SizeIs;
-using ::testing::StartsWith;
+using testing::AllOf, testing::AnyOf, testing::ElementsAre, testing::EndsWith, testing::HasSubstr, testing::IsEmpty;
+using testing::Not, testing::PrintToString, testing::SizeIs, testing::StartsWith;
 using Strings = std::vector<std::string>;
 
 inline constexpr const char* kTraceFile = "/var/log/ZEM_Support/ruvtav.log";
@@ -29,34 +21,25 @@ inline constexpr const char* kSystemInformationFile = "/var/log/TAV_Support/guih
 inline constexpr const char* kRepository = "/var/ZEM_Support";
 inline constexpr const char* kExpansionDirectory = "/tmp/tav";
 
-struct RunOptions {
-  std::string input;      // standard input, to its end
-  std::string prelude;    // shell text run just before the launcher; may put a command that starts it into $with
-  bool terminal = false;  // standard input is a non-blocking terminal; the input is typed after the question
-};
-inline RunOptions Input(const std::string& text) { return {text, "", false}; }
-inline RunOptions Typed(const std::string& text) { return {text, "", true}; }
-inline RunOptions Prelude(const std::string& shell_text) { return {"", shell_text, false}; }
-inline RunOptions With(const std::string& command) { return Prelude("with='" + command + "'"); }
-inline RunOptions Environment(const std::string& name, const std::string& value) {
-  return Prelude("export " + name + "='" + value + "'");
-}
-// Starts the launcher under another name than its full path.
-inline RunOptions StartedAs(const std::string& name) {
-  return Prelude("exec bash -c 'exec -a \"$0\" \"$@\"' '" + name + "' \"$0\" \"$@\"");
-}
-
 struct RunResult {
-  int status = -1;  // exit status; 1000 + N if signal N ended the launcher
+  int status = -1;  // as a shell gives it
   std::string out;  // standard output and standard error, in the order written
 };
+
+void WriteFile(const std::string& path, const std::string& text);
+std::string ReadFile(const std::string& path);  // empty if there is no such file
+
+// A prelude that sets an environment variable.
+inline std::string Environment(const std::string& name, const std::string& value) {
+  return "export " + name + "='" + value + "'";
+}
 
 class Installation {
  public:
   // Installs the launcher on a supported 64-bit rhel5 machine of type 1234, without a repository. Removes what an
   // earlier installation left in the launcher's fixed directories. Throws outside a sandbox.
   Installation();
-  ~Installation();
+  ~Installation() { fs::remove_all(directory_); }
   Installation(const Installation&) = delete;
   Installation& operator=(const Installation&) = delete;
 
@@ -70,15 +53,16 @@ class Installation {
   void InstallTool(const std::map<std::string, int>& exit_code_of_verb, const std::string& output = "") const;
   // Puts a copy script into the expansion directory, where expanding a package would put it.
   void InstallCopyScript(const std::string& then = "exit 0") const;
-  void CreateRepository() const;
-  // A package in the repository, which can be installed or, with another exit code of the comparison, cannot.
-  void OfferPackage(int comparison = 21) const;
+  void CreateRepository() const { fs::create_directory(kRepository); }
+  // A package in the repository that can be installed.
+  void OfferPackage(const std::string& tool_output = "") const;
   // Leaves the machine's type out of the support list.
-  void MakeUnsupported() const;
+  void MakeUnsupported() const { WriteFile(SupportListFile(), "<MT>9999</MT>\n"); }
 
-  // Runs the launcher in the empty directory "cwd" of the application's directory, in a process group of its own, and
-  // waits for it. After 20 seconds SIGALRM ends it.
-  RunResult Run(const Strings& arguments = {}, const RunOptions& options = {}) const;
+  // Runs the launcher in the empty directory "cwd" of the application's directory, without input, for at most 20
+  // seconds. The prelude is shell text that is run just before: it may put a command that starts the launcher into
+  // $with, or start "$launcher" "$@" itself.
+  RunResult Run(const Strings& arguments = {}, const std::string& prelude = "") const;
 
   // The calls that a stand-in has received: one element per call, each argument in brackets.
   Strings CallsOf(const std::string& name) const;
@@ -88,10 +72,11 @@ class Installation {
   std::string Trace() const;
   // The rest of each trace line that begins with "[TAVRUV]: " and the prefix.
   Strings TraceLines(const std::string& prefix) const;
-
-  std::string WithPlainDirectory(std::string text) const;
+  std::string LastTraceLine(const std::string& prefix) const;  // "none" if there is none
 
  private:
+  std::string WithPlainDirectory(const std::string& text) const;
+
   std::string directory_;
 };
 
@@ -101,6 +86,3 @@ bool IsInstrumented();
 
 // Returns the path of a program to be tested: of this build or, if RUV_TEST_PROGRAMS is set, in that directory.
 std::string TestedProgram(const std::string& built, const std::string& installed);
-
-void WriteFile(const std::string& path, const std::string& text);
-std::string ReadFile(const std::string& path);  // empty if there is no such file

@@ -1,46 +1,33 @@
 // Command-line parsing: what is forwarded and how, the identity options, rejected combinations and the help text.
-#include <regex>
-
 #include "installation.h"
 
 TEST(Options, ForwardsWhatIsNotItsOwn) {
-  struct Row {
-    Strings arguments;
-    std::string command;  // after the application's path
-    Strings unknown;      // options that the trace warns about
+  const std::pair<Strings, std::string> rows[] = {
+      {{}, " 2>/dev/null"},
+      {{"-v", "abc", "a-b", "-B", "-I", "-H"}, " -v \"abc\" a-b -B -I -H 2>/dev/null"},
+      {{"", "two words", "%s%n"}, " \"\" \"two words\" \"%s%n\" 2>/dev/null"},
+      {{"--IPMI-LAN", "u:p@10.0.0.1"}, " --ipmi-lan \"u:p@10.0.0.1\" 2>/dev/null"},
+      {{"--vmware-ESXI"}, " --vmware-esxi 2>/dev/null"},
+      {{"--GUI", "--cmd", "--Show_StdErr", "-x"}, " -x"},
+      {{"--help", "--", "--Proxy=80"}, " --help -- --Proxy=80 2>/dev/null"},
+      {{"--updat", "--update_x", "-update", "--\xc3\x84"}, " --updat --update_x -update --\xc3\x84 2>/dev/null"},
   };
-  const Row rows[] = {
-      {{}, " 2>/dev/null", {}},
-      {{"--show_stderr"}, "", {}},
-      {{"-v", "abc", "a-b", "-B", "-I", "-H"}, " -v \"abc\" a-b -B -I -H 2>/dev/null", {}},
-      {{"", "two words", "%s%n"}, " \"\" \"two words\" \"%s%n\" 2>/dev/null", {}},
-      {{"--IPMI-LAN", "u:p@10.0.0.1"}, " --ipmi-lan \"u:p@10.0.0.1\" 2>/dev/null", {}},
-      {{"--vmware-ESXI"}, " --vmware-esxi 2>/dev/null", {}},
-      {{"--help", "--", "--Proxy=80"}, " --help -- --Proxy=80 2>/dev/null", {"--help", "--", "--proxy=80"}},
-      {{"--GUI", "--cmd", "--Show_StdErr", "-x"}, " -x", {}},
-      {{"--updat", "--update_x", "-update"}, " --updat --update_x -update 2>/dev/null", {"--updat", "--update_x"}},
-      {{"--\xc3\x84"}, " --\xc3\x84 2>/dev/null", {"--\xc3\x84"}},
-  };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(PrintToString(row.arguments));
-    const Installation machine;
-    EXPECT_EQ(machine.Run(row.arguments).out, "");
-    EXPECT_THAT(machine.TraceLines("[Status:]InvokeRUV: command = "), ElementsAre("\"@/ruv\"" + row.command));
-    Strings expected;
-    for (const std::string& option : row.unknown) {
-      expected.push_back(option + "\" to RUV TAV, and it will be transfered to tavtool or RUV application.");
-    }
-    EXPECT_EQ(machine.TraceLines("[Status:]Warning: Unknown Parameter \""), expected);
+  const Installation machine;
+  for (const auto& [arguments, command] : rows) {
+    EXPECT_EQ(machine.Run(arguments).out, "");
+    EXPECT_EQ(machine.LastTraceLine("[Status:]InvokeRUV: command = "), "\"@/ruv\"" + command);
   }
+  EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(std::size(rows)));
+  Strings warnings;
+  for (const char* option : {"--help", "--", "--proxy=80", "--updat", "--update_x", "--\xc3\x84"}) {
+    warnings.push_back(std::string(option) + "\" to RUV TAV, and it will be transfered to tavtool or RUV application.");
+  }
+  EXPECT_EQ(machine.TraceLines("[Status:]Warning: Unknown Parameter \""), warnings);
 }
 
 TEST(Options, OverrideTheIdentity) {
-  struct Row {
-    Strings arguments;  // after "--chkupd"
-    std::string identity;
-    std::string forwarded;
-  };
-  const Row rows[] = {
+  // After "--chkupd"; the identity in the call of the tool, and what is forwarded to it.
+  const std::tuple<Strings, std::string, std::string> rows[] = {
       {{"--update_m", "5678", "--update_os", "sles11", "--Update_Arch", "32"}, "[-m][5678][-o][sles11][-a][32]", ""},
       {{"--update_m", "-h"}, "[-m][-h][-o][rhel5][-a][64]", ""},
       {{"--update_os"}, "[-m][1234][-o][rhel5][-a][64]", ""},
@@ -53,15 +40,13 @@ TEST(Options, OverrideTheIdentity) {
       {{"--update_m", "5678", "-i", "4321"}, "[-m][4321][-o][rhel5][-a][64]", "[-i][4321]"},
       {{"-i", "4321", "--update_m", "5678"}, "[-m][5678][-o][rhel5][-a][64]", "[-i][4321]"},
   };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(PrintToString(row.arguments));
-    const Installation machine;
-    Strings arguments = row.arguments;
+  const Installation machine;
+  for (auto [arguments, identity, forwarded] : rows) {
     arguments.insert(arguments.begin(), "--chkupd");
     EXPECT_EQ(machine.Run(arguments).status, 0);
-    EXPECT_THAT(machine.CallsOf("tavtool"),
-                ElementsAre("[compareweb][-l][@]" + row.identity + "[--latest]" + row.forwarded));
+    EXPECT_EQ(machine.CallsOf("tavtool").back(), "[compareweb][-l][@]" + identity + "[--latest]" + forwarded);
   }
+  EXPECT_THAT(machine.CallsOf("tavtool"), SizeIs(std::size(rows)));
 }
 
 TEST(Options, RejectCombinations) {
@@ -91,9 +76,11 @@ TEST(Options, HelpPrintsTheUsageText) {
   const Installation machine;
   const RunResult run = machine.Run({"-h"});
   EXPECT_EQ(run.status, 0);
-  // The download page is set when the launcher is built.
-  EXPECT_EQ(std::regex_replace(run.out, std::regex("https?://.*"), "URL"), ReadFile(USAGE_TEXT));
   EXPECT_THAT(machine.Trace(), EndsWith("[Debug:] Entering TAVMaster::ParseParameters()\n"));
+  // The download page is set when the launcher is built.
+  const std::string checksum = "launcher -h | sed 's,http.*,URL,' | cksum";
+  EXPECT_EQ(machine.Run({}, "cd ..; ./" + checksum + "; exit").out, "3727442611 3169\n")
+      << "The text has changed. If that is meant, change the number to what this prints: build/" << checksum;
 
   for (const Strings& arguments : {Strings{"-?"}, Strings{"--chkupd", "--update", "-?"},
                                    Strings{"--update_m", "1", "-h"}, Strings{"-html", "-h"}}) {

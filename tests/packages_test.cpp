@@ -61,7 +61,7 @@ TEST(Packages, PassTheVersionToTheCopyScript) {
     SCOPED_TRACE(output.substr(0, 60));
     WriteFile(machine.Directory() + "/tavtool.output", output);
     machine.Run();
-    EXPECT_EQ(machine.TraceLines("[Status:]CopyTAVToRUVFoler: command = ").back(),
+    EXPECT_EQ(machine.LastTraceLine("[Status:]CopyTAVToRUVFoler: command = "),
               "\"/tmp/tav/ruv/data/copy.sh\" \"/tmp/tav\" \"@\" \"/var/ZEM_Support\" " + version +
                   " 1>>/var/log/ZEM_Support/ruvtav.log 2>&1");
   }
@@ -72,42 +72,30 @@ TEST(Packages, InstallIfExpansionSucceedsAndThereIsACopyScript) {
   const std::string missing = "[Status:]CopyTAVToRUVFoler: script file \"/tmp/tav/ruv/data/copy.sh\" does not exist!";
   const std::string failed = "[Status:]DecompressTAV: Failed to copy TAV to RUV Folder!";
   const std::string success = "[Status:]DecompressTAV: Copy TAV to RUV Folder Successfully!";
-  struct Row {
-    int exit_code;       // of the expansion
-    std::string script;  // the copy script, or "none", or "directory"
-    std::string out;
-    Strings copy_calls;
-    Strings traced;
-  };
-  const Row rows[] = {
+  // The exit code of the expansion, the copy script, the output, the script's calls, and the trace.
+  const std::tuple<int, std::string, std::string, Strings, Strings> rows[] = {
       {52, "exit 0", done, {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}},
-      {61, "exit 0", done, {"[/tmp/tav][@][NO_TAV_PAYLOAD]"}, {success}},
       {32, "exit 3", done, {"[/tmp/tav][@][/var/ZEM_Support]"}, {success}},
-      {0, "none", "Failed\n", {}, {missing, failed}},
-      {52, "directory", "Failed\n", {}, {missing, failed}},
+      {0, "a directory", "Failed\n", {}, {missing, failed}},
       {21, "exit 0", "", {}, {}},
-      {1, "exit 0", "Invalid command parameter specified.\n", {}, {}},
   };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(row.exit_code);
+  for (const auto& [exit_code, script, out, copy_calls, messages] : rows) {
+    SCOPED_TRACE(exit_code);
     const Installation machine;
-    machine.CreateRepository();
-    machine.InstallTool({{"comparelocal", 21}, {"expand", row.exit_code}});
-    if (row.script == "directory") {
-      fs::create_directories("/tmp/tav/ruv/data/copy.sh");
-    } else if (row.script != "none") {
-      machine.InstallCopyScript(row.script);
-    }
+    machine.OfferPackage();
+    machine.InstallTool({{"comparelocal", 21}, {"expand", exit_code}});
+    machine.InstallCopyScript(script);
+    if (script == "a directory") fs::remove("/tmp/tav/ruv/data/copy.sh");
+    if (script == "a directory") fs::create_directory("/tmp/tav/ruv/data/copy.sh");
     EXPECT_EQ(machine.Run().out,
-              "Discovered RUV update(s) in local drive for this system.\nApplying update(s) please wait..." + row.out);
-    EXPECT_EQ(machine.CallsOf("copy.sh"), row.copy_calls);
+              "Discovered RUV update(s) in local drive for this system.\nApplying update(s) please wait..." + out);
+    EXPECT_EQ(machine.CallsOf("copy.sh"), copy_calls);
     Strings traced;
     for (const std::string& line : {missing, failed, success}) {
       if (!machine.TraceLines(line).empty()) traced.push_back(line);
     }
-    EXPECT_EQ(traced, row.traced);
-    EXPECT_EQ(ReadFile(machine.SupportListFile()),
-              row.out == done ? "<MT>1234</MT>\n\n<MT>1234</MT>" : "<MT>1234</MT>\n");
+    EXPECT_EQ(traced, messages);
+    EXPECT_EQ(ReadFile(machine.SupportListFile()), out == done ? "<MT>1234</MT>\n\n<MT>1234</MT>" : "<MT>1234</MT>\n");
     EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre(""));
   }
 }

@@ -5,9 +5,8 @@
 // The whole trace of one run.
 TEST(RunSequence, InstallsAPackageFromTheRepositoryAndStartsTheApplication) {
   const Installation machine;
-  machine.CreateRepository();
+  machine.OfferPackage("Name=pack\nVersion=2.31a\n");
   machine.MakeUnsupported();
-  machine.InstallTool({{"comparelocal", 21}}, "Name=pack\nVersion=2.31a\n");
   machine.InstallCopyScript("echo copied; echo oops >&2");
   machine.Install("ruv", "echo application; echo hidden >&2; exit 9");
 
@@ -66,49 +65,42 @@ oops
 }
 
 TEST(RunSequence, UpdateModeStopsAtAFailedStepAndNeverStartsTheApplication) {
-  struct Row {
-    std::string option;
-    std::map<std::string, int> tool;  // exit codes of its verbs
-    std::string out;                  // after the first line
-    Strings verbs;
-    std::string appended;  // to the support list
-  };
   const std::string detected = "RUV update(s) detected, start downloading...";
+  const std::string applying = detected + "Applying update(s) please wait...";
   const std::string there = "There's new update for this system, use --update to download\n";
   const std::string latest = "You already have the latest version RUV.\n";
   const std::string no_kro = detected + "Couldn't ping KRO, maybe the KRO is down.\nFailed\n";
-  const std::string applying = detected + "Applying update(s) please wait...";
   const std::string invalid = applying + "Invalid command parameter specified.\nDone\n";
-  const Strings check = {"compareweb"};
-  const Strings download = {"compareweb", "acquire"};
-  const Strings compare = {"compareweb", "acquire", "comparelocal"};
-  const Strings all = {"compareweb", "acquire", "comparelocal", "expand"};
-  const Row rows[] = {
-      {"--chkupd", {}, there, check, ""},
-      {"--chkupd", {{"compareweb", 30}}, latest, check, ""},
-      {"--CHKUPD", {{"compareweb", 21}}, "", check, ""},
-      {"--update", {{"compareweb", 2}}, "", check, ""},
-      {"--update", {{"acquire", 77}}, detected + "Failed\n", download, ""},
-      {"--update", {{"acquire", 21}}, detected + "Failed\n", download, ""},
-      {"--update", {{"acquire", 52}}, detected + "Failed\n", download, ""},
-      {"--update", {{"acquire", 45}}, no_kro, download, ""},
-      {"--update", {{"compareweb", 32}, {"acquire", 32}}, detected + "Done\n", compare, ""},
-      {"--update", {{"comparelocal", 30}}, detected + latest + "Done\n", compare, ""},
-      {"--update", {{"comparelocal", 52}}, detected + "Done\n", compare, ""},
-      {"--Update", {{"comparelocal", 21}}, applying + "Done\nDone\n", all, "\n<MT>1234</MT>"},
-      {"--update", {{"comparelocal", 21}, {"expand", 1}}, invalid, all, ""},
+  using Codes = std::map<std::string, int>;
+  // The tool's exit codes, how many of its steps are run, and the output after the first line.
+  const std::tuple<std::string, Codes, int, std::string> rows[] = {
+      {"--chkupd", {}, 1, there},
+      {"--chkupd", {{"compareweb", 30}}, 1, latest},
+      {"--CHKUPD", {{"compareweb", 21}}, 1, ""},
+      {"--update", {{"compareweb", 2}}, 1, ""},
+      {"--update", {{"acquire", 77}}, 2, detected + "Failed\n"},
+      {"--update", {{"acquire", 21}}, 2, detected + "Failed\n"},
+      {"--update", {{"acquire", 52}}, 2, detected + "Failed\n"},
+      {"--update", {{"acquire", 45}}, 2, no_kro},
+      {"--update", {{"compareweb", 32}, {"acquire", 32}}, 3, detected + "Done\n"},
+      {"--update", {{"comparelocal", 30}}, 3, detected + latest + "Done\n"},
+      {"--update", {{"comparelocal", 52}}, 3, detected + "Done\n"},
+      {"--Update", {{"comparelocal", 21}}, 4, applying + "Done\nDone\n"},
+      {"--update", {{"comparelocal", 21}, {"expand", 1}}, 4, invalid},
   };
-  for (const Row& row : rows) {
-    SCOPED_TRACE(row.option + " " + PrintToString(row.tool));
+  const Strings steps = {"compareweb", "acquire", "comparelocal", "expand"};
+  for (const auto& [option, exit_codes, count, out] : rows) {
+    SCOPED_TRACE(option + " " + PrintToString(exit_codes));
     const Installation machine;
-    machine.InstallTool(row.tool);
+    machine.InstallTool(exit_codes);
     machine.InstallCopyScript();
-    const RunResult run = machine.Run({row.option});
+    const RunResult run = machine.Run({option});
     EXPECT_EQ(run.status, 0);
-    EXPECT_EQ(run.out, "Detecting available update on internet, please wait...\n" + row.out);
-    EXPECT_EQ(machine.ToolVerbs(), row.verbs);
+    EXPECT_EQ(run.out, "Detecting available update on internet, please wait...\n" + out);
+    EXPECT_EQ(machine.ToolVerbs(), Strings(steps.begin(), steps.begin() + count));
+    const bool installed = count == 4 && exit_codes.count("expand") == 0;
+    EXPECT_EQ(ReadFile(machine.SupportListFile()), installed ? "<MT>1234</MT>\n\n<MT>1234</MT>" : "<MT>1234</MT>\n");
     EXPECT_THAT(machine.CallsOf("ruv"), IsEmpty());
-    EXPECT_EQ(ReadFile(machine.SupportListFile()), "<MT>1234</MT>\n" + row.appended);
     EXPECT_THAT(machine.Trace(), EndsWith("[Debug:] Exiting TAVMaster::TAVMasterMain()\n"
                                           "[TAVRUV]: [Debug:] Entering TAVMaster::~TAVMaster()\n"
                                           "[TAVRUV]: [Debug:] Exiting TAVMaster::~TAVMaster()\n"));
@@ -116,22 +108,18 @@ TEST(RunSequence, UpdateModeStopsAtAFailedStepAndNeverStartsTheApplication) {
 }
 
 TEST(RunSequence, LaunchModeComparesIfThereIsARepository) {
-  const std::pair<Strings, Strings> rows[] = {
-      {{}, {"comparelocal"}},
-      {{"--VMware-ESXi", "host"}, {}},
-      {{"--ipmi-lan"}, {}},
-  };
-  for (const auto& [arguments, verbs] : rows) {
-    const Installation machine;
-    machine.Run(arguments);
-    EXPECT_THAT(machine.ToolVerbs(), IsEmpty());
-    EXPECT_FALSE(fs::exists(kRepository));
-    machine.CreateRepository();
-    machine.InstallTool({{"comparelocal", 52}});  // no payload: nothing to install
-    EXPECT_EQ(machine.Run(arguments).out, "");
-    EXPECT_EQ(machine.ToolVerbs(), verbs);
-    EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(2));
-  }
+  const Installation machine;
+  EXPECT_EQ(machine.Run().out, "");
+  EXPECT_THAT(machine.ToolVerbs(), IsEmpty());
+  EXPECT_FALSE(fs::exists(kRepository));
+  machine.CreateRepository();
+  machine.InstallTool({{"comparelocal", 52}});  // no payload: nothing to install
+  EXPECT_EQ(machine.Run({"--VMware-ESXi", "host"}).out, "");
+  EXPECT_EQ(machine.Run({"--ipmi-lan"}).out, "");
+  EXPECT_THAT(machine.ToolVerbs(), IsEmpty());
+  EXPECT_EQ(machine.Run().out, "");
+  EXPECT_THAT(machine.ToolVerbs(), ElementsAre("comparelocal"));
+  EXPECT_THAT(machine.CallsOf("ruv"), SizeIs(4));
 }
 
 TEST(RunSequence, ExtendsTheSearchPathsForEveryProgram) {
@@ -143,27 +131,25 @@ TEST(RunSequence, ExtendsTheSearchPathsForEveryProgram) {
       {"export LD_LIBRARY_PATH=/usr/lib; PATH=/bin", "/usr/lib:" + libraries + "|/bin:./mellanox\n"},
   };
   const Installation machine;
-  for (const char* program : {"ruv", "guihelper.sh"}) {
-    machine.Install(program, "echo \"$LD_LIBRARY_PATH|$PATH\" >\"$0.environment\"");
-  }
+  for (const char* program : {"ruv", "guihelper.sh"})
+    machine.Install(program, "echo \"$LD_LIBRARY_PATH|$PATH\" >>../seen");
+  const std::string seen = machine.Directory() + "/seen";
   for (const auto& [prelude, environment] : rows) {
-    machine.Run({}, Prelude(prelude));
-    EXPECT_EQ(ReadFile(machine.Directory() + "/ruv.environment"), environment);
-    EXPECT_EQ(ReadFile(machine.Directory() + "/guihelper.sh.environment"), environment);
+    machine.Run({}, prelude);
+    EXPECT_EQ(ReadFile(seen), environment + environment);
+    fs::remove(seen);
   }
   // Shells have a PATH of their own if there is none: the application reads its environment as the kernel shows it.
   machine.Install("ruv", "/bin/cat /proc/self/environ >\"$0.environment\"");
-  machine.Run({}, Prelude("unset PATH"));
+  machine.Run({}, "unset PATH");
   EXPECT_THAT(ReadFile(machine.Directory() + "/ruv.environment"), HasSubstr(std::string("\0PATH=./mellanox\0", 17)));
 }
 
 TEST(RunSequence, GivesTheApplicationTheNewSupportListAndNoOpenFiles) {
   const Installation machine;
-  machine.CreateRepository();
-  machine.InstallTool({{"comparelocal", 21}}, "Version=1.00");
-  machine.InstallCopyScript();
+  machine.OfferPackage();
   machine.Install("guihelper.sh", "cd /proc/$$/fd; echo * >\"$0.files\"");
-  machine.Install("ruv", "cat \"${0%/*}/data/supportlist.xml\"; cd /proc/$$/fd; echo * >\"$0.files\"");
+  machine.Install("ruv", "cat ../data/supportlist.xml; cd /proc/$$/fd; echo * >\"$0.files\"");
   EXPECT_THAT(machine.Run().out, EndsWith("Done\n<MT>1234</MT>\n\n<MT>1234</MT>"));
   EXPECT_EQ(ReadFile(machine.Directory() + "/ruv.files"), ReadFile(machine.Directory() + "/guihelper.sh.files"));
 }
@@ -175,7 +161,7 @@ TEST(RunSequence, EndsAtOnceIfTheToolIsInterrupted) {
     machine.CreateRepository();
     // Like Ctrl-C: signals the whole foreground process group, here one of the launcher's own.
     machine.Install("tavtool", "kill -INT 0; sleep 1");
-    const RunResult run = machine.Run({option}, With("setsid --wait"));
+    const RunResult run = machine.Run({option}, "with='setsid --wait'");
     EXPECT_EQ(run.status, 1);
     EXPECT_THAT(run.out, EndsWith("RUV application is determined by the user!\n"));
     EXPECT_THAT(machine.Trace(), EndsWith(" 2>&1\n"));
@@ -188,21 +174,22 @@ TEST(RunSequence, ProgramsDieOfSigpipeUnlessTheParentIgnoresIt) {
   const Installation machine;
   machine.Install("ruv", "kill -PIPE $$; echo survived");
   EXPECT_EQ(machine.Run().out, "");
-  EXPECT_EQ(machine.Run({}, Prelude("trap '' PIPE")).out, "survived\n");
+  EXPECT_EQ(machine.Run({}, "trap '' PIPE").out, "survived\n");
 }
 
 TEST(RunSequence, GoesOnWhateverItsParentLeftToIt) {
-  const RunOptions rows[] = {
-      With("env --ignore-signal=CHLD"),
-      Prelude("mkfifo pipe; sleep 0.2 <pipe & exec >pipe; wait"),  // a console that nobody reads
-      Prelude("exec >&-"),                                         // a file that is opened gets its descriptor
-      Prelude("exec <&- >&- 2>&-"),
+  const std::string preludes[] = {
+      "with='env --ignore-signal=CHLD'",
+      "mkfifo pipe; sleep 0.2 <pipe & exec >pipe; wait",  // a console that nobody reads
+      "exec >&-",                                         // a file that is opened gets its descriptor
+      "exec <&- >&- 2>&-",
   };
-  for (const RunOptions& row : rows) {
-    SCOPED_TRACE(row.prelude);
+  for (const std::string& prelude : preludes) {
+    SCOPED_TRACE(prelude);
     const Installation machine;
-    machine.OfferPackage(30);
-    EXPECT_EQ(machine.Run({"-x"}, row).status, 0);
+    machine.CreateRepository();
+    machine.InstallTool({{"comparelocal", 30}});
+    EXPECT_EQ(machine.Run({"-x"}, prelude).status, 0);
     EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre("[-x]"));
     EXPECT_THAT(machine.TraceLines("You already"), SizeIs(1)) << "no exit code, or console text in the trace";
   }
@@ -211,10 +198,8 @@ TEST(RunSequence, GoesOnWhateverItsParentLeftToIt) {
 TEST(RunSequence, SurvivesAFileSizeLimitAndAFullDisk) {
   if (IsInstrumented()) GTEST_SKIP() << "valgrind writes files of its own";
   const Installation machine;
-  EXPECT_EQ(machine.Run({}, Prelude("ulimit -f 0")).status, 0);
-  fs::remove(kTraceFile);
-  EXPECT_EQ(machine.Run({}, Prelude("mkdir -p /var/log/ZEM_Support; ln -s /dev/full " + std::string(kTraceFile))).out,
-            "");
+  EXPECT_EQ(machine.Run({}, "ulimit -f 0").status, 0);
+  EXPECT_EQ(machine.Run({}, "ln -sf /dev/full " + std::string(kTraceFile)).out, "");
   EXPECT_THAT(machine.CallsOf("ruv"), ElementsAre(""));
 }
 
@@ -227,7 +212,7 @@ std::map<std::string, int> RunsOutOfMemory(const Strings& arguments, int bytes, 
   machine.Install("ruv", "echo started");
   for (; run.status <= 1; bytes -= bytes / (run.out == "started\n" ? 16 : steps)) {
     fs::remove(kTraceFile);
-    run = machine.Run(arguments, With("prlimit --as=" + std::to_string(bytes)));
+    run = machine.Run(arguments, "with='prlimit --as=" + std::to_string(bytes) + "'");
     if (run.status != 1) continue;
     EXPECT_THAT(run.out, EndsWith("ERROR: Not enough memory, RUV launcher ends.\n"));
     const Strings lines = machine.TraceLines("");
