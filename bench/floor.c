@@ -5,11 +5,10 @@
 
 int main(int argc, char** argv) {
   static char path[1 << 16];
-  const char* old_path = getenv("PATH");
-  snprintf(path, sizeof path, "%s:./mellanox", old_path == NULL ? "" : old_path);
+  snprintf(path, sizeof path, "%s:./mellanox", getenv("PATH"));
   setenv("LD_LIBRARY_PATH", "./:./qlogic/qcccli/:./qlogic/:./fibre/:./megalsi:./mellanox:./nvidia", 1);
   setenv("PATH", path, 1);
-  int last_status = 0;
-  for (int i = 1; i < argc; ++i) last_status = system(argv[i]);
-  return last_status == -1;
+  for (int i = 1; i < argc; ++i) {
+    if (system(argv[i]) == -1) return 1;
+  }
 }
