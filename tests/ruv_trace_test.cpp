@@ -210,7 +210,7 @@ TEST(RuvTrace, PrintsEveryField) {
   // The application's command, which the launcher may have cut, and what follows it in the trace.
   const std::string x(457, 'x'), end = " 2>/dev/null";
   for (const auto& [traced, shown] : std::vector<std::pair<std::string, std::string>>{
-           {"ruv \"x\ny\"" + end + "\nbackground", "ruv \"x\ny\"" + end},
+           {"ruv \"x\ny" + end + "z\"" + end + "\nbackground", "ruv \"x\ny" + end + "z\"" + end},
            {"ruv -b\nbackground", "ruv -b..."},  // --show_stderr
            {x + "123456789012" + end, x + "123456789012" + end + "..."},
            {x + "1234567890123" + end, x + "1234567890123 2>/dev/nul..."}}) {
