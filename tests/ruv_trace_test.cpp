@@ -138,7 +138,7 @@ TEST(RuvTrace, GivesTheMeaningOfExitCodes) {
               -b:comparelocal=128<Return  | problem | unknown exit code                       | check_failed
               -b:comparelocal=129<Return  | problem | unknown exit code, or ended by a signal | check_failed
               -b<Cmd [TAVRUV]:%[Status:]Return%Code%from%tavtool%=%-1 | problem | the shell could not be started or waited for | check_failed
-              -b:expand=52<Foler          | ok      | no payload                              | expanded
+              -b:expand=52<copy.sh        | ok      | no payload                              | expanded
               -b:expand=21                | problem | unexpected exit code                    | expansion_failed
               -b:expand=30                | problem | You already have the latest version RUV | expansion_failed
               -b{none}                    | ok      | success                                 | no_copy_script
@@ -166,6 +166,7 @@ TEST(RuvTrace, ReportsWhatARunDid) {
               --update:comparelocal=0        | ok 1234 update package: nothing newer; ruv not started
               --update:acquire=31            | problem 1234 update acquire 31: There's no update available for this s...
               --update_m,1                   | none 1234 ? options rejected
+              --chkupd<Upd [TAVRUV]:%[Status:]CheckUpdate:TAVToolCmd%=%x --chkupd>Cmd | ok 1234 check package: available; ruv not started
               -v:expand=52{printf%x}         | ok 1234 launch 2.31: copy script ran; ruv started
               -v --chkupd:compareweb=30 -b   | problem 1234 launch 2.31 installed again, or a version th...; ruv started
               -v -b:comparelocal=0 -b        | ok 1234 launch 2.31: copy script ran; ruv started
@@ -225,7 +226,7 @@ TEST(RuvTrace, FollowsConcurrentRuns) {
   // The trace; its runs that are ok, problem, unknown and none; and what is said of the first run.
   for (const Strings& row : Table(
            R"(-b<guihelper.sh -b                           | 1 0 1 0  | unknown ? ? unfinished: in guihelper
-              -b<Cmd -b                                    | 1 0 1 0  | unknown 1234 launch unfinished: in tavtool
+              -b:/media<Cmd -b                             | 1 0 1 0  | unknown 1234 launch unfinished: in tavtool
               --chkupd:compareweb=42<Cmd -h --chkupd:compareweb=42>Cmd | 0 1 0 1 | problem 1234 check compareweb 42
               -b</ruv" 19x--chkupd -b>/ruv"                | 20 0 0 0 | ok 1234 launch 2.31
               -b</ruv" 20x--chkupd -b>/ruv"                | 20 0 1 0 | unknown 1234 launch unfinished: in ruv

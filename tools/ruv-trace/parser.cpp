@@ -214,9 +214,7 @@ struct Parser {
   void InvokeRUV(bool may_ask) {
     while (Take("[Debug:] Processing special parameters [")) {
       const auto option = Take("[Error:]InvokeRUV: required parameters are missing for option = ");
-      if (!option) continue;
-      Fail("option " + *option + " has no value");
-      break;
+      if (option) Fail("option " + *option + " has no value");
     }
     run_.command = ExpectCommand("[Status:]InvokeRUV: command = ", "unfinished: in ruv or at the question before it",
                                  " 2>/dev/null");
