@@ -4,6 +4,7 @@ _ruv_trace() {
   if [[ $current == -* ]]; then
     mapfile -t COMPREPLY < <(compgen -W '--problems --long --json --check --max-age= --show-passwords -h --help --version' \
       -- "$current")
+    if [[ ${COMPREPLY[*]} == *= ]]; then compopt -o nospace; fi
   else
     compopt -o filenames
     mapfile -t COMPREPLY < <(compgen -f -- "$current")

@@ -87,7 +87,6 @@ std::string Composed(const std::string& pieces) {
   }
   return trace;
 }
-
 }  // namespace
 
 TEST(RuvTrace, FollowsTheLauncherStepByStep) {
@@ -213,6 +212,7 @@ TEST(RuvTrace, PrintsEveryField) {
   for (const auto& [traced, shown] : std::vector<std::pair<std::string, std::string>>{
            {"ruv \"x\ny" + end + "z\"" + end + "\nbackground", "ruv \"x\ny" + end + "z\"" + end},
            {"ruv -b\nbackground", "ruv -b..."},  // --show_stderr
+           {"ruv --proxy-address=" + x + end, "ruv --proxy-address ***..."},
            {x + "123456789012" + end, x + "123456789012" + end + "..."},
            {x + "1234567890123" + end, x + "1234567890123 2>/dev/nul..."}}) {
     const std::string command = "[TAVRUV]: [Status:]InvokeRUV: command = " + traced.substr(0, 481);
@@ -233,7 +233,7 @@ TEST(RuvTrace, FollowsConcurrentRuns) {
               2x-b<Cmd -b>Cmd                              | 1 0 1 0  | unknown 1234 launch unfinished: in tavtool
               2x-b<Cmd 2x-b>Cmd                            | 0 0 2 0  | unknown ? ? mixed
               -b<Cmd -b -b>Cmd                             | 0 0 2 0  | unknown ? ? mixed
-              --chkupd<Cmd -b<Cmd --chkupd>Cmd -b>Cmd      | 0 0 2 0  | unknown ? ? mixed
+              -b<Cmd -b --chkupd<Cmd -b:comparelocal=0<Cmd --chkupd>Cmd -b:comparelocal=0>Cmd | 1 0 3 0 | unknown ? ? mixed
               -b<copy.sh --chkupd<Cmd sh:%1:%/tmp/tav/ruv/data/copy.sh:%Permission%denied --chkupd>Cmd -b>copy.sh | 1 1 0 0 | problem 1234 launch copy script not run: Perm
               -b<copy.sh --chkupd:compareweb=42 -b>copy.sh | 1 1 0 0 | ok 1234 launch 2.31
               -b</ruv" -b<copy.sh -b>/ruv" -b>copy.sh      | 1 1 0 0 | ok 1234 launch 2.31

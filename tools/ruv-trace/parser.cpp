@@ -190,7 +190,7 @@ struct Parser {
       Expect("[Status:]DecompressTAV: Failed to copy TAV to RUV Folder!");
       return;
     }
-    run_.copy_command = Expect(kCopyScriptMessage, "unfinished: in the copy script");
+    run_.copy_command = Expect(kCopyScriptMessage, "unfinished: in the copy script").substr(0, kMessageBufferSize);
     // The shell's own complaint, "sh: ...SCRIPT: REASON", shows that it could not run the script.
     static const std::regex kComplaint("\nsh: .*?/" + COPYSCRIPT + ": (.*)");
     std::smatch match;

@@ -19,7 +19,8 @@ std::string Shown(const Command& command, bool show_passwords) {
       R"(--proxy-address(?=[\s\S]*@)))(?![a-z0-9])[\s\S]*?((?: 2>/dev/null| 1>/dev/null| 1>tav\.log| 2>&1)*))",
       std::regex::icase);
   std::smatch parts;
-  const std::string arguments = command.text.substr(std::min(command.arguments, command.text.size()));
+  std::string arguments = command.text.substr(std::min(command.arguments, command.text.size()));
+  if (command.cut) arguments += "...:@";  // what is missing may show that there is a password
   if (show_passwords || !std::regex_match(arguments, parts, kPassword)) return command.text;
   return command.text.substr(0, command.arguments) + parts.str(1) + " ***" + parts.str(2);
 }

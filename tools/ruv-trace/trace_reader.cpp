@@ -94,7 +94,7 @@ bool TraceReader::TakeStray(const std::string& text) {
   if (IsClosing(text)) return true;
   bool is_explained = false;
   for (Followed& each : followed_) {
-    if (!each.expected.empty() && !each.messages.empty()) each.Mix();
+    if (!each.expected.empty() && !each.messages.empty()) each.mixed = true;
     is_explained = is_explained || !each.expected.empty();
   }
   if (is_explained) return true;

@@ -4,7 +4,8 @@
 // one that it fits.
 // - If it fits an older one as well, it may be that one's. If the older one was killed, nothing is wrong with that. But
 //   if it writes another message later, both are mixed: what each of them did is not known.
-// - A message that fits no run shows that some are missing: all unfinished runs are mixed.
+// - A message that fits no run shows that some are missing: all unfinished runs are mixed, but not
+//   the complete ones after them.
 // - The messages after the application's end are the same in all runs: they mix no runs, and mean nothing if they fit
 //   none.
 //
