@@ -79,6 +79,7 @@ class TAVMaster {
 
   // Appends "[TAVRUV]: ", the printf-formatted message cut at 511 bytes, and a line feed to the trace file. Prints
   // "Failed to save log into logfile" if the file cannot be opened; otherwise reports no failure. Never throws.
+  // ruv-trace reads the messages in their order: a change of one also changes tools/ruv-trace/parser.cpp.
   void DebugLog(const char* format, ...) const noexcept __attribute__((format(printf, 2, 3)));
   // Returns the trace file's path. Runs mkdir -p (bare path, output not discarded) if its directory is missing.
   std::string GetLogfileName() const;

@@ -181,6 +181,7 @@ int main(int argc, char** argv) {
     const char* end = letter == 'a' ? optarg + std::strlen(optarg) : nullptr;
     const bool is_days = end != nullptr && std::from_chars(optarg, end, options.max_age).ptr == end;
     if (letter == 0 || (is_days && options.max_age >= 0)) continue;
+    if (letter == 'a') Complain("--max-age needs a number of days");
     std::fputs("Try ruv-trace --help.\n", stderr);
     return kUsageError;
   }
