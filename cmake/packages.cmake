@@ -1,6 +1,5 @@
 # The packages (.deb, .rpm): the programs in /opt/ruv, everything else in the system's directories. scripts/package builds
 # and checks them, and makes the archive.
-set(RUV_PACKAGE_RELEASE 1 CACHE STRING "Release number of the packages")
 set(CPACK_GENERATOR DEB RPM)
 set(CPACK_PROJECT_CONFIG_FILE ${PROJECT_SOURCE_DIR}/cmake/package_components.cmake)
 set(CPACK_PACKAGING_INSTALL_PREFIX /)

@@ -1,7 +1,7 @@
 #compdef ruv-trace
 # Completion of ruv-trace's command line for zsh: options and files.
 _arguments \
-  '--problems[show only the runs that are not ok]' \
+  '--problems[show only problems and runs whose outcome is unknown]' \
   '(--json --check)--long[also show the line number, full reason and commands of each run]' \
   '(--long)--json[print one JSON object per run]' \
   '(--long)--check[judge the last run that launched or updated]' \

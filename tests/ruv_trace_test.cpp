@@ -115,7 +115,7 @@ TEST(RuvTrace, FollowsTheLauncherStepByStep) {
       std::size_t state = 0;
       while (!is(states[state][0])) ++state;
       EXPECT_EQ(RunOf(before + line).at("reason"), states[state][1]);
-      // Not in every run: these lines. While the copy script runs, any line may be its own.
+      // These lines are not in every run. While the copy script runs, any line may be its own.
       if (is("mkdir") || is("special parameters") || is("Unknown Parameter")) continue;
       EXPECT_THAT(LastRun(before + after), StartsWith("unknown "));
       // The last four lines are the same in all runs.
