@@ -16,7 +16,7 @@ foreach(file man/ruv-launcher.8 man/ruv-trace.8 CHANGELOG.md ${PROJECT_BINARY_DI
   set_property(DIRECTORY APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS ${file})
 endforeach()
 
-# The notices of the libraries that are linked statically come from the Debian package.
+# The licence, and the notices of the libraries that are linked statically.
 file(READ LICENSE copyright)
 set(notices ${CMAKE_SYSROOT}/usr/share/doc/nlohmann-json3-dev/copyright)
 if(EXISTS ${notices})

@@ -1,5 +1,4 @@
-# Toolchain: clang++ and lld with the libraries of Debian 11, which scripts/sysroot extracts. The programs run on systems
-# with glibc 2.17 or newer.
+# Toolchain: clang++ and lld with the libraries of Debian 11, which scripts/sysroot extracts.
 #   cmake -DCMAKE_TOOLCHAIN_FILE=cmake/sysroot.cmake -DRUV_ARCH=arm64 ...
 set(RUV_ARCH amd64 CACHE STRING "Debian architecture to build for: amd64, arm64 or i386")
 list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES RUV_ARCH)

@@ -10,7 +10,7 @@ const std::string kQuestion = "Do you want to proceed anyway (function may be li
 
 std::string Repeated(int count, const std::string& text) { return count == 0 ? "" : text + Repeated(count - 1, text); }
 
-// A prelude that gives the launcher this input, printf's format.
+// A prelude that gives the launcher this input, a printf format.
 std::string Input(const std::string& text) { return "printf '" + text + "' >input; exec <input"; }
 
 }  // namespace

@@ -1,8 +1,8 @@
 #!/usr/bin/env bash
 # Compares the completions for bash and zsh with the usage texts: they must offer the same options and values.
-# Usage: tests/completion_test.sh LAUNCHER [RUV-TRACE]     (exit status 77, "skipped", without zsh)
+# Usage: tests/completion_test.sh LAUNCHER RUV-TRACE     (exit status 77, "skipped", without zsh)
 set -euo pipefail
-launcher=$1 ruv_trace=${2-}
+launcher=$1 ruv_trace=$2
 cd "$(dirname "${BASH_SOURCE[0]}")/../completions"
 if ! command -v zsh >/dev/null; then
   echo "skipped: zsh is not installed"
@@ -42,10 +42,8 @@ for option in --update_os --update_arch; do
   expect_same "zsh, $option" "$(values_of "$option")" "$(in_zsh "$option")"
 done
 
-if [[ -n $ruv_trace ]]; then
-  expected=$("$ruv_trace" --help | grep -oE '^  -[^ =]+=?( -[^ ]+)?' | tr -d , | tr ' ' '\n' | grep .)
-  expect_same "bash, ruv-trace" "$expected" "$(in_bash ruv-trace -)"
-  expect_same "zsh, ruv-trace" "$expected" "$(zsh_descriptions ruv-trace | options_in)"
-  expect_same "bash, files" "$(ls)" "$(in_bash ruv-trace '')"
-fi
+expected=$("$ruv_trace" --help | grep -oE '^  -[^ =]+=?( -[^ ]+)?' | tr -d , | tr ' ' '\n' | grep .)
+expect_same "bash, ruv-trace" "$expected" "$(in_bash ruv-trace -)"
+expect_same "zsh, ruv-trace" "$expected" "$(zsh_descriptions ruv-trace | options_in)"
+expect_same "bash, files" "$(ls)" "$(in_bash ruv-trace '')"
 [[ -z $failed ]]

@@ -165,7 +165,7 @@ TEST(Discovery, EndsTheRunWithOneLineIfTheDirectoryIsUnknown) {
 }
 
 TEST(Discovery, FindsTheDirectoryWithoutProcIfThePathIsKnown) {
-  if (IsInstrumented() || std::getenv("RUV_SANDBOX") != std::string("namespace")) GTEST_SKIP() << "needs /proc";
+  if (IsInstrumented() || std::getenv("RUV_SANDBOX") != std::string("namespace")) GTEST_SKIP() << "needs namespaces";
   const Installation machine;
   const std::string without_proc = "exec unshare --mount sh -c 'mount -t tmpfs none /proc; ";
   const std::string on_search_path = "PATH=\"" + machine.Directory() + ":$PATH\"; exec launcher'";

@@ -1,5 +1,4 @@
 // The package steps: their commands, the directories that they make, the version that they pass on.
-
 #include "installation.h"
 
 TEST(Packages, OnlineCommandsGetTheForwardedArguments) {

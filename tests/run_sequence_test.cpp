@@ -1,5 +1,4 @@
 // Whole runs: which steps follow which, and how a run reacts to signals, limits and closed streams.
-
 #include "installation.h"
 
 // The whole trace of one run.
@@ -123,7 +122,7 @@ TEST(RunSequence, LaunchModeComparesIfThereIsARepository) {
 }
 
 TEST(RunSequence, ExtendsTheSearchPathsForEveryProgram) {
-  if (IsInstrumented()) GTEST_SKIP() << "valgrind extends LD_LIBRARY_PATH itself";
+  if (IsInstrumented()) GTEST_SKIP() << "valgrind and sanitizers change it";
   const std::string libraries = "./:./qlogic/qcccli/:./qlogic/:./fibre/:./megalsi:./mellanox:./nvidia";
   const std::pair<std::string, std::string> rows[] = {
       {"unset LD_LIBRARY_PATH; PATH=/usr/bin:/bin", libraries + "|/usr/bin:/bin:./mellanox\n"},

@@ -115,10 +115,10 @@ TEST(RuvTrace, FollowsTheLauncherStepByStep) {
       std::size_t state = 0;
       while (!is(states[state][0])) ++state;
       EXPECT_EQ(RunOf(before + line).at("reason"), states[state][1]);
-      // These lines are not in every run. While the copy script runs, any line may be its own.
+      // These lines are not in every run.
       if (is("mkdir") || is("special parameters") || is("Unknown Parameter")) continue;
       EXPECT_THAT(LastRun(before + after), StartsWith("unknown "));
-      // The last four lines are the same in all runs.
+      // While the copy script runs, any line may be its own; the last four lines are the same in all runs.
       if (begin == 0 || is("CopyTAVToRUVFoler: command") || std::count(after.begin(), after.end(), '\n') < 4) continue;
       EXPECT_THAT(LastRun(before + line + line + after), StartsWith("unknown "));
       EXPECT_THAT(LastRun(before + next + line + after.substr(next.size())), StartsWith("unknown "));

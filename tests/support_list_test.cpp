@@ -1,5 +1,4 @@
 // The list of supported machine types: what counts as an entry, and what an installation appends.
-
 #include "installation.h"
 
 TEST(SupportList, ReadsColumns5To8OfALineWithATag) {

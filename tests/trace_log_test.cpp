@@ -1,5 +1,4 @@
 // The trace file: its lines, and runs in which it cannot be written.
-
 #include "installation.h"
 #include "launcher/tav.h"
 

@@ -17,9 +17,9 @@ class LineReader {
   // False if the file could not be opened. A directory can be opened, but reading it fails at once.
   bool IsOpen() const { return file_ != nullptr; }
 
-  // Sets the line, without its line feed; it is valid until the next call. Returns false at the end of the file and
-  // after a read error, also if the error came in the middle of a line. Throws std::bad_alloc if the line does not fit
-  // into memory.
+  // The file must be open. Sets the line, without its line feed; it is valid until the next call. Returns false at the
+  // end of the file and after a read error, also if the error came in the middle of a line. Throws std::bad_alloc if
+  // the line does not fit into memory.
   bool Next(std::string_view& line);
 
  private:

@@ -12,8 +12,8 @@
 
 namespace {
 
-// Ends the process with one line and status 1, instead of an abort and a core file. The launcher itself throws only a
-// plain std::exception. Anything else is a lack of memory; the type is null if not even the exception could be created.
+// Ends the process with one line and status 1, instead of an abort and a core file. A plain std::exception
+// means an unknown directory. Anything else is a lack of memory; the type is null if not even it could be created.
 [[noreturn]] void ReportUncaughtException() {
   const std::type_info* type = abi::__cxa_current_exception_type();
   const bool directory_is_unknown = type != nullptr && *type == typeid(std::exception);
@@ -26,7 +26,7 @@ namespace {
 // Runs before the constructors of the static strings, for which memory may run out as well.
 [[gnu::constructor(101)]] void InstallTerminateHandler() { std::set_terminate(ReportUncaughtException); }
 
-// Runs the launcher in a session of its own. An exception passes through a handler here because otherwise the process
+// Creates the session and runs it. An exception passes through a handler here because otherwise the process
 // would end without unwinding the stack, that is, without the session's destructor.
 int RunSession(int argc, char** argv) {
   try {

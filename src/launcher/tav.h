@@ -23,9 +23,9 @@ class TAVMaster {
  public:
   // ---- Session ------------------------------------------------------------------------------------------------------
 
-  // Discovers the machine and fills every field: the launcher's directory, the identity that guihelper.sh reports, the
-  // support list, the fixed directories. Prints a warning if guihelp.dat or the support list cannot be opened. Throws a
-  // plain std::exception if the launcher's own directory cannot be found.
+  // Discovers the machine and fills every field: the launcher's directory, the identity that guihelper.sh (bare path)
+  // reports, the support list, the fixed directories. Prints a warning if guihelp.dat or the support list cannot be
+  // opened. Throws a plain std::exception if the launcher's own directory cannot be found.
   TAVMaster();
   TAVMaster(const TAVMaster&) = delete;
   TAVMaster& operator=(const TAVMaster&) = delete;
@@ -78,8 +78,8 @@ class TAVMaster {
   // ---- Trace log ----------------------------------------------------------------------------------------------------
 
   // Appends "[TAVRUV]: ", the printf-formatted message cut at 511 bytes, and a line feed to the trace file. Prints
-  // "Failed to save log into logfile" if the file cannot be opened; otherwise reports no failure. Never throws.
-  // ruv-trace reads the messages in their order: a change of one also changes tools/ruv-trace/parser.cpp.
+  // "Failed to save log into logfile" if it cannot be opened or memory runs out; a failed write is not reported. Never
+  // throws. ruv-trace reads the messages in their order: a change of one also changes tools/ruv-trace/parser.cpp.
   void DebugLog(const char* format, ...) const noexcept __attribute__((format(printf, 2, 3)));
   // Returns the trace file's path. Runs mkdir -p (bare path, output not discarded) if its directory is missing.
   std::string GetLogfileName() const;
@@ -122,13 +122,13 @@ class TAVMaster {
   // Creates both directories if they are missing; leaves "tav.log" in the current directory. Returns the tool result: 2
   // if there is a package to install.
   int CompareTAVPackage(std::string repository_path, std::string installation_path);
-  // Has the tool expand the repository's package into the expansion directory and installs it with the package's copy
-  // script; reports the outcome to the user. Creates both directories if they are missing. Returns 0, or 1 if the tool
-  // failed or the package has no copy script.
+  // Has the tool (bare path) expand the repository's package into the expansion directory and installs it with the
+  // package's copy script; reports the outcome to the user. Creates both directories if they are missing. Returns 0, or
+  // 1 if the tool failed or the package has no copy script.
   int DecompressTAV(std::string repository_path, std::string expansion_path) const;
   // Runs ruv/data/copy.sh of the expansion directory with the arguments expansion directory, working path, package
-  // source (a path, or "NO_TAV_PAYLOAD") and package version (bare); its output is appended to the trace file. Returns
-  // 1 if it was run, whatever its status, and 0 if there is no such file.
+  // source (a path, or "NO_TAV_PAYLOAD") and package version (bare); its output is appended to the trace file (bare
+  // path). Returns 1 if it was run, whatever its status, and 0 if there is no such file.
   int CopyTAVToRUVFoler(std::string package_source, std::string expansion_path, std::string working_path) const;
   // Has the tool copy the packages in a portable installation's update folder to the repository, which is created if it
   // is missing. Returns the tool result, or 1 if there is no update folder.

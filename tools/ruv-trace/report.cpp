@@ -20,7 +20,7 @@ std::string Shown(const Command& command, bool show_passwords) {
       std::regex::icase);
   std::smatch parts;
   std::string arguments = command.text.substr(std::min(command.arguments, command.text.size()));
-  if (command.cut) arguments += "...:@";  // what is missing may show that there is a password
+  if (command.cut) arguments += ":@";  // what is missing may contain them, and the password
   if (show_passwords || !std::regex_match(arguments, parts, kPassword)) return command.text;
   return command.text.substr(0, command.arguments) + parts.str(1) + " ***" + parts.str(2);
 }

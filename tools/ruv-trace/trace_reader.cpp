@@ -8,7 +8,7 @@
 namespace ruv_trace {
 namespace {
 constexpr std::size_t kMostFollowed = 20;   // an unfinished run with that many after it is given up
-constexpr std::size_t kMostMessages = 500;  // of a run; an ordinary one has about fifty
+constexpr std::size_t kMostMessages = 500;  // of a run; an installing one has about forty
 constexpr std::size_t kKeptText = 1024;     // of a message with the lines after it; more than a command
 
 bool IsClosing(const std::string& message) {

@@ -1,17 +1,16 @@
 // Groups the lines of a trace into runs.
 //
-// The lines do not name their process. Every unfinished run is followed, at most twenty: a message goes to the newest
-// one that it fits.
+// The lines do not name their process. A run is followed until it is complete or twenty others have begun after it. A
+// message goes to the newest unfinished one that it fits.
 // - If it fits an older one as well, it may be that one's. If the older one was killed, nothing is wrong with that. But
 //   if it writes another message later, both are mixed: what each of them did is not known.
-// - A message that fits no run shows that some are missing: all unfinished runs are mixed, but not
-//   the complete ones after them.
+// - A message that fits no run shows that some are missing: the unfinished runs are mixed, and no others.
 // - The messages after the application's end are the same in all runs: they mix no runs, and mean nothing if they fit
 //   none.
 //
 // What this design gives up: if one of several overlapping runs is killed where another one's later messages fit it, it
-// may be taken for complete. A complete run is never judged by another one's messages. All unattended ways to start the
-// launcher take a lock.
+// may be taken for complete. That is rare: unattended runs take a lock. A complete run is never judged by another one's
+// messages.
 #pragma once
 
 #include <functional>
